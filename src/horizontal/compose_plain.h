@@ -1,0 +1,70 @@
+// Plain composition: neither source alpha nor a destination alpha plane
+// (tables H_YUY2, H_W210, H_RGBQ).
+//
+// With S the computed sample in stored depth (limited to 0..M first when the
+// call clamps), D the destination sample, L the level (4096 = 1.0), c the
+// 14-bit weight of a partly covered pixel and o the sample's black or neutral
+// offset:
+//
+//   whole pixel, L = 4096:   D' = S
+//   whole pixel, other L:    D' = (D (4096 - L) + S L + 2048) >> 12
+//   partial, overlay:        D' = (D (16384 - c) + S c + 8192) >> 14
+//   partial, tile:           D' = clamp(D + (((S - o) c + 8192) >> 14))
+//
+// Overlay is a plain mix of in-range values and is not clamped. Tile adds the
+// contribution above black or neutral, so two tiles whose coverages sum to
+// one add up to the whole sample over a black destination; a whole pixel in
+// tile mode replaces D (tile acts at partly covered pixels only). A level
+// above 4096 is a gain and runs through the same arithmetic; stores keep the
+// low bits of the result.
+#pragma once
+
+#include "horizontal/pixel.h"
+#include "shared/map_context.h"
+
+namespace lorvex::horizontal {
+
+struct PlainFamily {
+    static constexpr bool source_alpha = false;
+    static constexpr bool dest_alpha = false;
+    static constexpr bool running_tile_regions = true;  // RGBQ regions in tile mode
+
+    template <class Dst, class Shape>
+    static void whole(const MapContext& c, typename Dst::sample* d, uint16_t*, const Px& px)
+    {
+        using T = typename Dst::sample;
+        if (c.level == 4096) {
+            for (int i = 0; i < Shape::n; ++i) d[Shape::at[i]] = T(px.s[i]);
+        } else {
+            const int32_t l = c.level;
+            for (int i = 0; i < Shape::n; ++i) {
+                const int32_t D = d[Shape::at[i]];
+                d[Shape::at[i]] = T((D * (4096 - l) + px.s[i] * l + 2048) >> 12);
+            }
+        }
+    }
+
+    // `w` is the 14-bit weight c14 of the pixel.
+    template <class Dst, class Shape>
+    static void partial(const MapContext& c, typename Dst::sample* d, uint16_t*, const Px& px, int32_t w)
+    {
+        using T = typename Dst::sample;
+        for (int i = 0; i < Shape::n; ++i) {
+            const int32_t D = d[Shape::at[i]];
+            if (c.tile) {
+                const int32_t o = offset_of<Dst, Shape>(i);
+                d[Shape::at[i]] = T(clamp_to(D + (((px.s[i] - o) * w + 8192) >> 14), 0, Dst::max));
+            } else {
+                d[Shape::at[i]] = T((D * (16384 - w) + px.s[i] * w + 8192) >> 14);
+            }
+        }
+    }
+
+    template <class Dst>
+    static int32_t weight(const MapContext& c, int32_t hc)
+    {
+        return weight_c14(hc, c.vcover, c.level);
+    }
+};
+
+}  // namespace lorvex::horizontal
