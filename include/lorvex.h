@@ -183,7 +183,7 @@ static inline uint32_t lorvex_flag_filters(int hkind, int vkind)
  * declared below so that the interface reads whole, but linking against them
  * fails until a version that draws them. */
 #define LORVEX_HAS_MAP_RECTANGLE 1
-#define LORVEX_HAS_MULTISRC_MAP_RECTANGLE 0
+#define LORVEX_HAS_MULTISRC_MAP_RECTANGLE 1
 #define LORVEX_HAS_ROLL_RECTANGLE 0
 #define LORVEX_HAS_CRAWL_RECTANGLE 0
 #define LORVEX_HAS_MAP_POLYGON 0

@@ -25,9 +25,24 @@
 namespace lorvex::horizontal {
 
 struct PlainFamily {
-    static constexpr bool source_alpha = false;
     static constexpr bool dest_alpha = false;
-    static constexpr bool running_tile_regions = true;  // RGBQ regions in tile mode
+    static constexpr bool source_alpha = false;
+    static constexpr bool clamps_always = false;
+    static constexpr int unclamped_max_taps = 8;
+
+    // The RGBQ bank kernels of 4 taps and more limit the sample of a whole
+    // pixel at full level whatever `clamp` says.
+    template <class Dst, class Sampler>
+    static constexpr bool clamp_whole_at_full_level()
+    {
+        return !Dst::pairs && Sampler::taps >= 4;
+    }
+
+    template <class Dst>
+    static int32_t weight(const MapContext& c, int32_t hc)
+    {
+        return weight_c14(hc, c.vcover, c.level);
+    }
 
     template <class Dst, class Shape>
     static void whole(const MapContext& c, typename Dst::sample* d, uint16_t*, const Px& px)
@@ -60,10 +75,31 @@ struct PlainFamily {
         }
     }
 
+    // Constant regions: the samples are limited, then every pixel takes the
+    // partial rule. In tile mode the RGBQ regions carry a running sum: after
+    // a pixel's four sums are stored, clamped, the unclamped sums become the
+    // samples of the next pixel; this compounding is intended.
     template <class Dst>
-    static int32_t weight(const MapContext& c, int32_t hc)
+    static bool region_setup(const MapContext&, Px& px)
     {
-        return weight_c14(hc, c.vcover, c.level);
+        for (int e = 0; e < 4; ++e) px.s[e] = clamp_to(px.s[e], 0, Dst::max);
+        return true;
+    }
+
+    template <class Dst, class Shape>
+    static void region_pixel(const MapContext& c, typename Dst::sample* d, uint16_t* da, Px& px, int32_t w)
+    {
+        if constexpr (!Dst::pairs) {
+            if (c.tile) {
+                for (int e = 0; e < 4; ++e) {
+                    const int32_t sum = d[e] + ((px.s[e] * w + 8192) >> 14);
+                    d[e] = typename Dst::sample(clamp_to(sum, 0, Dst::max));
+                    px.s[e] = sum;
+                }
+                return;
+            }
+        }
+        partial<Dst, Shape>(c, d, da, px, w);
     }
 };
 

@@ -1,12 +1,23 @@
 // The horizontal kernel tables. Each is the product of a destination layout
-// and a composition family; all share the walk of walk.h and the samplers of
-// sample_area.h and sample_taps.h.
+// and a composition family (plain, _DA destination alpha, _SA source alpha,
+// _SA_DA both, and alpha only); all share the walk of walk.h and the samplers
+// of sample_area.h and sample_taps.h.
 #pragma once
 
 #include "shared/map_context.h"
 
 namespace lorvex {
 extern const HorizontalKernelTable H_YUY2;
+extern const HorizontalKernelTable H_YUY2_DA;
+extern const HorizontalKernelTable H_YUY2_SA;
+extern const HorizontalKernelTable H_YUY2_SA_DA;
 extern const HorizontalKernelTable H_W210;
+extern const HorizontalKernelTable H_W210_DA;
+extern const HorizontalKernelTable H_W210_SA;
+extern const HorizontalKernelTable H_W210_SA_DA;
 extern const HorizontalKernelTable H_RGBQ;
+extern const HorizontalKernelTable H_RGBQ_DA;
+extern const HorizontalKernelTable H_RGBQ_SA;
+extern const HorizontalKernelTable H_RGBQ_SA_DA;
+extern const HorizontalKernelTable H_ALPHA;
 }  // namespace lorvex

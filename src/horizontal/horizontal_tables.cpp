@@ -1,8 +1,13 @@
 // The horizontal kernel tables: one per destination layout and composition
-// family, slot order as in map_context.h.
+// family, slot order as in map_context.h. Every main kernel is the one walk
+// of walk.h with a sampler (area, linear, bank of 2(T + 1) taps) and a family.
 #include "horizontal/horizontal_kernels.h"
 
+#include "horizontal/compose_alpha.h"
+#include "horizontal/compose_da.h"
 #include "horizontal/compose_plain.h"
+#include "horizontal/compose_sa.h"
+#include "horizontal/compose_sa_da.h"
 #include "horizontal/sample_area.h"
 #include "horizontal/sample_taps.h"
 #include "horizontal/walk.h"
@@ -11,30 +16,50 @@ namespace lorvex {
 namespace horizontal {
 namespace {
 
-template <class Dst, class Family, int T>
-constexpr Kernel bank()
-{
-    return main_kernel_C<Dst, BankSampler<Dst, T>, Family, Dst::pairs>;
-}
+// The kernels of one table. Samples in stored depth; alpha in the unit the
+// family reads (AlphaShift: 0 for 1/16384, 2 for 1/4096, kNoAlpha).
+template <class Dst, class Family, int AlphaShift, class BankFamily = Family>
+struct Kernels {
+    using Spec = StoredSpec<Dst, AlphaShift>;
+    // The area walk of RGBQ runs in steps of two pixels, like the pairs.
+    static constexpr bool kAreaPairs = !Dst::alpha_only;
+
+    static constexpr Kernel left = region_C<Dst, Family, false>;
+    static constexpr Kernel right = region_C<Dst, Family, true>;
+    static constexpr Kernel area = main_kernel_C<Dst, AreaSampler<Spec>, Family, kAreaPairs>;
+    static constexpr Kernel linear = main_kernel_C<Dst, LinearSampler<Spec>, Family, Dst::pairs>;
+    template <int T>
+    static constexpr Kernel bank = main_kernel_C<Dst, BankSampler<Spec, T>, BankFamily, Dst::pairs>;
+};
+
+// The source-alpha tables: slots 2 to 5 choose per call between the fast form
+// (colour in buffer units, alpha in 1/16384) and the general form.
+template <class Dst>
+struct SourceAlphaKernels : Kernels<Dst, SourceAlphaFamily, 0> {
+    using Base = Kernels<Dst, SourceAlphaFamily, 0>;
+    using Spec = typename Base::Spec;
+    using FastArea = SampleSpec<Dst, 0, 0, true>;
+    using Fast = SampleSpec<Dst, 0, 0>;
+
+    static constexpr Kernel area = fast_or_general_C<Dst, AreaSampler<Spec>, AreaSampler<FastArea>,
+                                                     SourceAlphaFamily, SourceAlphaFastFamily, true>;
+    static constexpr Kernel linear = fast_or_general_C<Dst, LinearSampler<Spec>, LinearSampler<Fast>,
+                                                       SourceAlphaFamily, SourceAlphaFastFamily, Dst::pairs>;
+    template <int T>
+    static constexpr Kernel bank =
+        T <= 1 ? fast_or_general_C<Dst, BankSampler<Spec, T>, BankSampler<Fast, T>, SourceAlphaFamily,
+                                   SourceAlphaFastFamily, Dst::pairs>
+               : Base::template bank<T>;
+};
 
 // Kind 7's empty main kernel stands in slot 12 where `HasEdge`.
-template <class Dst, class Family, bool HasEdge>
+template <class K, bool HasEdge = true>
 constexpr HorizontalKernelTable make_table()
 {
     return {
-        region_C<Dst, Family, false>,
-        region_C<Dst, Family, true>,
-        main_kernel_C<Dst, AreaSampler<Dst>, Family, true>,
-        main_kernel_C<Dst, LinearSampler<Dst>, Family, Dst::pairs>,
-        bank<Dst, Family, 0>(),
-        bank<Dst, Family, 1>(),
-        bank<Dst, Family, 2>(),
-        bank<Dst, Family, 3>(),
-        bank<Dst, Family, 4>(),
-        bank<Dst, Family, 5>(),
-        bank<Dst, Family, 6>(),
-        bank<Dst, Family, 7>(),
-        HasEdge ? empty_C : nullptr,
+        K::left,        K::right,       K::area,        K::linear,      K::template bank<0>,
+        K::template bank<1>, K::template bank<2>, K::template bank<3>, K::template bank<4>,
+        K::template bank<5>, K::template bank<6>, K::template bank<7>, HasEdge ? empty_C : nullptr,
         nullptr,
     };
 }
@@ -42,8 +67,21 @@ constexpr HorizontalKernelTable make_table()
 }  // namespace
 }  // namespace horizontal
 
-constexpr HorizontalKernelTable H_YUY2 = horizontal::make_table<DstYuy2, horizontal::PlainFamily, true>();
-constexpr HorizontalKernelTable H_W210 = horizontal::make_table<DstW210, horizontal::PlainFamily, false>();
-constexpr HorizontalKernelTable H_RGBQ = horizontal::make_table<DstRgbq, horizontal::PlainFamily, true>();
+using namespace horizontal;
+
+constexpr HorizontalKernelTable H_YUY2 = make_table<Kernels<DstYuy2, PlainFamily, kNoAlpha>>();
+constexpr HorizontalKernelTable H_YUY2_DA = make_table<Kernels<DstYuy2, DestAlphaFamily, kNoAlpha>>();
+constexpr HorizontalKernelTable H_YUY2_SA = make_table<SourceAlphaKernels<DstYuy2>>();
+constexpr HorizontalKernelTable H_YUY2_SA_DA = make_table<Kernels<DstYuy2, SourceDestAlphaFamily, 2>>();
+constexpr HorizontalKernelTable H_W210 = make_table<Kernels<DstW210, PlainFamily, kNoAlpha>, false>();
+constexpr HorizontalKernelTable H_W210_DA = make_table<Kernels<DstW210, DestAlphaFamily, kNoAlpha>>();
+constexpr HorizontalKernelTable H_W210_SA = make_table<SourceAlphaKernels<DstW210>>();
+constexpr HorizontalKernelTable H_W210_SA_DA = make_table<Kernels<DstW210, SourceDestAlphaFamily, 2>>();
+constexpr HorizontalKernelTable H_RGBQ = make_table<Kernels<DstRgbq, PlainFamily, kNoAlpha>>();
+constexpr HorizontalKernelTable H_RGBQ_DA = make_table<Kernels<DstRgbq, DestAlphaFamily, kNoAlpha>>();
+constexpr HorizontalKernelTable H_RGBQ_SA = make_table<SourceAlphaKernels<DstRgbq>>();
+constexpr HorizontalKernelTable H_RGBQ_SA_DA = make_table<Kernels<DstRgbq, SourceDestAlphaFamily, 2>>();
+constexpr HorizontalKernelTable H_ALPHA =
+    make_table<Kernels<DstAlpha, AlphaOnlyFamily, 2, AlphaOnlyBankFamily>>();
 
 }  // namespace lorvex

@@ -35,6 +35,12 @@ struct ShapeQuad {  // RGBQ: four samples alike
     static constexpr bool chroma[4] = {false, false, false, false};
 };
 
+struct ShapeNone {  // alpha-only images: no colour samples
+    static constexpr int n = 0;
+    static constexpr int at[1] = {0};
+    static constexpr bool chroma[1] = {false};
+};
+
 template <class Dst, class Shape>
 constexpr int32_t offset_of(int i)
 {

@@ -24,23 +24,27 @@
 #pragma once
 
 #include "horizontal/pixel.h"
+#include "horizontal/sample_spec.h"
 #include "shared/map_context.h"
 
 namespace lorvex::horizontal {
 
-template <class Dst>
+template <class Spec>
 struct AreaSampler {
-    static constexpr bool always_clamp = false;
-    static constexpr bool clamp_whole_at_full_level = false;
+    using Dst = typename Spec::Dst;
+    static constexpr int taps = 0;
+    static constexpr bool is_bank = false;
 
     const int16_t* line;
+    const int16_t* line_a;
     int32_t w;
     int32_t p;   // current luma sample (pixel index)
     int32_t r;   // width of it still to use
     int32_t p2;  // current chroma pair
     int32_t r2;
 
-    AreaSampler(const MapContext& c, const StripRecord& s, bool first_even) : line(c.line), w(c.hstep)
+    AreaSampler(const MapContext& c, const StripRecord& s, bool first_even)
+        : line(c.line), line_a(c.line_a), w(c.hstep)
     {
         p = s.phase / w;
         r = w - s.phase % w;
@@ -55,16 +59,49 @@ struct AreaSampler {
         }
     }
 
-    void sample(Px& px, bool with_chroma)
+    // One component of a walk: sample n of it stands at base[n * E], and its
+    // sum starts at `bias`.
+    struct Comp {
+        const int16_t* base;
+        int32_t E;
+        int64_t bias;
+        int64_t acc;
+    };
+
+    // Consumes `span` of width for every component, and moves the walk on.
+    // Whole pixels may take two shortcuts, which give the loop's result when
+    // one or two samples cover the span - except in the fast source-alpha
+    // variant, whose colour from two samples has no rounding term, a result of
+    // its own that is kept. Partly covered pixels always run the loop.
+    template <int N>
+    static void walk(Comp (&cs)[N], int32_t& p, int32_t& r, int32_t w, int32_t span, bool whole,
+                     int truncated_pair)
     {
-        constexpr int N = Dst::pairs ? 1 : 4;
-        constexpr int E = Dst::pairs ? 2 : 4;
-        int64_t acc[N];
-        for (int e = 0; e < N; ++e) acc[e] = int64_t(1) << (15 + Dst::buffer_shift);
-        int32_t span = 0x10000;
+        if (whole && r >= span) {
+            for (auto& c : cs) c.acc = int64_t(c.base[p * c.E]) * span + c.bias;
+            r -= span;
+            if (r == 0) {
+                ++p;
+                r = w;
+            }
+            return;
+        }
+        if (whole && r + w >= span) {
+            for (auto& c : cs)
+                c.acc = int64_t(c.base[p * c.E]) * r + int64_t(c.base[(p + 1) * c.E]) * (span - r) + c.bias;
+            for (int e = 0; e < truncated_pair; ++e) cs[e].acc -= cs[e].bias;
+            r += w - span;
+            ++p;
+            if (r == 0) {
+                ++p;
+                r = w;
+            }
+            return;
+        }
+        for (auto& c : cs) c.acc = c.bias;
         do {
             const int32_t n = r < span ? r : span;
-            for (int e = 0; e < N; ++e) acc[e] += int64_t(line[p * E + e]) * n;
+            for (auto& c : cs) c.acc += int64_t(c.base[p * c.E]) * n;
             span -= n;
             r -= n;
             if (r == 0) {
@@ -72,25 +109,29 @@ struct AreaSampler {
                 r = w;
             }
         } while (span != 0);
-        for (int e = 0; e < N; ++e) px.s[e] = int32_t(acc[e] >> (16 + Dst::buffer_shift));
+    }
+
+    void sample(Px& px, bool with_chroma, bool whole = false)
+    {
+        constexpr int N = Dst::colour_samples;
+        constexpr int E = Dst::pairs ? 2 : 4;
+        constexpr int cs = Spec::colour_shift;
+        constexpr int M = N + (Spec::alpha ? 1 : 0);
+        Comp c[M];
+        for (int e = 0; e < N; ++e) c[e] = {line + e, E, int64_t(1) << (15 + cs), 0};
+        if constexpr (Spec::alpha) c[N] = {line_a, 1, int64_t(1) << (15 + Spec::alpha_shift), 0};
+        walk<M>(c, p, r, w, 0x10000, whole, Spec::truncated_pair_luma ? N : 0);
+        for (int e = 0; e < N; ++e) px.s[e] = int32_t(c[e].acc >> (16 + cs));
+        if constexpr (Spec::alpha) px.a = int32_t(c[N].acc >> (16 + Spec::alpha_shift));
 
         if constexpr (Dst::pairs) {
             if (!with_chroma) return;
-            int64_t cb = int64_t(1) << (16 + Dst::buffer_shift), cr = cb;
-            int32_t cspan = 0x20000;
-            do {
-                const int32_t n = r2 < cspan ? r2 : cspan;
-                cb += int64_t(line[4 * p2 + 1]) * n;
-                cr += int64_t(line[4 * p2 + 3]) * n;
-                cspan -= n;
-                r2 -= n;
-                if (r2 == 0) {
-                    ++p2;
-                    r2 = 2 * w;
-                }
-            } while (cspan != 0);
-            px.s[1] = int32_t(cb >> (17 + Dst::buffer_shift));
-            px.s[2] = int32_t(cr >> (17 + Dst::buffer_shift));
+            // Cb and Cr of pair j stand at elements 4j + 1 and 4j + 3.
+            const int64_t bias = int64_t(1) << (16 + cs);
+            Comp cc[2] = {{line + 1, 4, bias, 0}, {line + 3, 4, bias, 0}};
+            walk<2>(cc, p2, r2, 2 * w, 0x20000, whole, 0);
+            px.s[1] = int32_t(cc[0].acc >> (17 + cs));
+            px.s[2] = int32_t(cc[1].acc >> (17 + cs));
         }
     }
 

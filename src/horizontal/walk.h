@@ -34,7 +34,8 @@ namespace lorvex::horizontal {
 template <class Dst>
 inline typename Dst::sample* dst_pixel(const MapContext& c, int32_t x)
 {
-    return reinterpret_cast<typename Dst::sample*>(c.dst_line + ptrdiff_t(x) * Dst::bytes_per_pixel);
+    uint8_t* base = Dst::alpha_only ? c.dst_line2 : c.dst_line;
+    return reinterpret_cast<typename Dst::sample*>(base + ptrdiff_t(x) * Dst::bytes_per_pixel);
 }
 
 template <class Family>
@@ -58,22 +59,31 @@ inline void limit(Px& px)
     for (int i = 0; i < N; ++i) px.s[i] = clamp_to(px.s[i], 0, Dst::max);
 }
 
+// The shape of a pixel that draws its pair's chroma (or all its samples), and
+// of one that draws luma only.
+template <class Dst>
+using FullShape = std::conditional_t<Dst::pairs, ShapeEven, std::conditional_t<Dst::alpha_only, ShapeNone, ShapeQuad>>;
+template <class Dst>
+using LumaShape = std::conditional_t<Dst::pairs, ShapeOdd, FullShape<Dst>>;
+
 // Slots 2..11: the walk, with Sampler computing the samples and Family
 // compositing them.
 template <class Dst, class Sampler, class Family, bool RunInPairs>
 void main_kernel_C(const MapContext& c, const StripRecord& s)
 {
-    using Even = std::conditional_t<Dst::pairs, ShapeEven, ShapeQuad>;
-    using Odd = std::conditional_t<Dst::pairs, ShapeOdd, ShapeQuad>;
+    using Even = FullShape<Dst>;
+    using Odd = LumaShape<Dst>;
     constexpr int kRun = RunInPairs ? 2 : 1;
     constexpr int kRunShift = RunInPairs ? 17 : 16;
     constexpr int32_t kRunWidth = 0x10000 * kRun;
+    constexpr bool kAlwaysClamp = Family::clamps_always || Sampler::taps > Family::unclamped_max_taps;
 
     int32_t x = s.x;
     auto* d = dst_pixel<Dst>(c, x);
     Sampler smp(c, s, is_even<Dst>(d));
-    const bool clamp = c.clamp || Sampler::always_clamp;
-    const bool clamp_whole = clamp || (Sampler::clamp_whole_at_full_level && c.level == 4096);
+    const bool clamp = c.clamp || kAlwaysClamp;
+    const bool clamp_whole =
+        clamp || (Family::template clamp_whole_at_full_level<Dst, Sampler>() && c.level == 4096);
     const bool full_line = c.vcover == 16384;
     int32_t hc = s.first_cover;
     int32_t rem = s.width16;
@@ -85,16 +95,16 @@ void main_kernel_C(const MapContext& c, const StripRecord& s)
                 const int32_t n = rem >> kRunShift;
                 rem &= (1 << kRunShift) - 1;
                 for (int32_t k = 0; k < n; ++k) {
-                    smp.sample(px, true);
+                    smp.sample(px, true, true);
                     smp.advance();
                     if (clamp_whole) limit<Dst, Even::n>(px);
                     if constexpr (kRun == 2) {
-                        smp.sample(px2, false);
+                        smp.sample(px2, false, true);
                         smp.advance();
                         if (clamp_whole) limit<Dst, Odd::n>(px2);
                         Family::template whole<Dst, Even>(c, d, dst_alpha<Family>(c, x), px);
-                        Family::template whole<Dst, Odd>(c, d + Dst::bytes_per_pixel / sizeof(*d),
-                                                         dst_alpha<Family>(c, x + 1), px2);
+                        Family::template whole<Dst, Odd>(c, dst_pixel<Dst>(c, x + 1), dst_alpha<Family>(c, x + 1),
+                                                         px2);
                     } else {
                         Family::template whole<Dst, Even>(c, d, dst_alpha<Family>(c, x), px);
                     }
@@ -106,11 +116,11 @@ void main_kernel_C(const MapContext& c, const StripRecord& s)
             hc = std::min(rem, 0x10000);
         }
         const bool even = is_even<Dst>(d);
-        smp.sample(px, even);
+        smp.sample(px, even, false);
         smp.advance();
-        if (clamp) limit<Dst, 4>(px);
+        if (clamp) limit<Dst, Even::n>(px);
         const int32_t w = Family::template weight<Dst>(c, hc);
-        if (!Dst::pairs || even)
+        if (even)
             Family::template partial<Dst, Even>(c, d, dst_alpha<Family>(c, x), px, w);
         else
             Family::template partial<Dst, Odd>(c, d, dst_alpha<Family>(c, x), px, w);
@@ -122,19 +132,27 @@ void main_kernel_C(const MapContext& c, const StripRecord& s)
     }
 }
 
+// The main kernels of the source-alpha tables in slots 2 to 5: the fast form
+// in buffer units at `clamp` 0 and full level, the general form otherwise.
+template <class Dst, class Sampler, class FastSampler, class Family, class FastFamily, bool RunInPairs>
+void fast_or_general_C(const MapContext& c, const StripRecord& s)
+{
+    if (!c.clamp && c.level == 4096)
+        main_kernel_C<Dst, FastSampler, FastFamily, RunInPairs>(c, s);
+    else
+        main_kernel_C<Dst, Sampler, Family, RunInPairs>(c, s);
+}
+
 // Slots 0 and 1: paint a constant region with the first (slot 0) or last
 // (slot 1) valid sample of the buffer. The samples are read once and brought
-// to stored depth by truncation (x >> 5 or x >> 3, no rounding term), then
-// limited to 0..M; every pixel takes the partial-pixel rule.
+// to stored depth by truncation (x >> 5 or x >> 3, no rounding term); the
+// family then limits them and handles source alpha, and every pixel takes
+// its partial rule.
 //
 // Slot 0 reads pixel `pad_left` (chroma: elements 2 pad_left + 1 and + 3);
 // slot 1 reads pixel `last` (chroma: elements 2 last - 1 and 2 last + 1). For a
 // source of odd width, `last` is even and those two elements are the chroma of
 // the previous pair and of the last one: the region takes them as they stand.
-//
-// In tile mode the RGBQ regions carry a running sum: after a pixel's four
-// sums are stored, clamped, the unclamped sums become the samples of the next
-// pixel. This compounding is intended.
 template <class Dst, class Family, bool Right>
 void region_C(const MapContext& c, const StripRecord& s)
 {
@@ -149,26 +167,19 @@ void region_C(const MapContext& c, const StripRecord& s)
         px.s[1] = Right ? c.line[2 * at - 1] : c.line[2 * at + 1];
         px.s[2] = Right ? c.line[2 * at + 1] : c.line[2 * at + 3];
     } else {
-        for (int e = 0; e < 4; ++e) px.s[e] = c.line[4 * at + e];
+        for (int e = 0; e < Dst::colour_samples; ++e) px.s[e] = c.line[4 * at + e];
     }
-    for (int e = 0; e < 4; ++e) px.s[e] = clamp_to(px.s[e] >> Dst::buffer_shift, 0, Dst::max);
+    for (int e = 0; e < 4; ++e) px.s[e] >>= Dst::buffer_shift;
+    if constexpr (Family::source_alpha) px.a = c.line_a[at];
+    if (!Family::template region_setup<Dst>(c, px)) return;
 
-    constexpr bool running = !Dst::pairs && Family::running_tile_regions;
     for (int32_t x = first_x;; ++x) {
         auto* d = dst_pixel<Dst>(c, x);
         const int32_t w = Family::template weight<Dst>(c, hc);
-        if (running && c.tile) {
-            for (int e = 0; e < 4; ++e) {
-                const int32_t sum = d[e] + ((px.s[e] * w + 8192) >> 14);
-                d[e] = typename Dst::sample(clamp_to(sum, 0, Dst::max));
-                px.s[e] = sum;
-            }
-        } else if (!Dst::pairs || is_even<Dst>(d)) {
-            using Even = std::conditional_t<Dst::pairs, ShapeEven, ShapeQuad>;
-            Family::template partial<Dst, Even>(c, d, dst_alpha<Family>(c, x), px, w);
-        } else {
-            Family::template partial<Dst, ShapeOdd>(c, d, dst_alpha<Family>(c, x), px, w);
-        }
+        if (is_even<Dst>(d))
+            Family::template region_pixel<Dst, FullShape<Dst>>(c, d, dst_alpha<Family>(c, x), px, w);
+        else
+            Family::template region_pixel<Dst, LumaShape<Dst>>(c, d, dst_alpha<Family>(c, x), px, w);
         rem -= hc;
         if (rem <= 0) return;
         hc = std::min(rem, 0x10000);

@@ -7,13 +7,17 @@
 // costs nothing: a line_period of 0 or below draws nothing; a span that would
 // need more than 16 strips draws nothing; a filter kind whose kernel the
 // pairing's table lacks (horizontal kind 7 into W210 without alpha, vertical
-// kind 7 from a source other than YUY2 or RGBQ) draws nothing.
+// kind 7 from a source other than YUY2 or RGBQ without alpha plane) draws
+// nothing. Vertical kind 7 has no alpha pass, so a premultiplied source with an
+// alpha plane is refused with it rather than drawn from an unfilled alpha
+// section.
 #include <cmath>
 #include <limits>
 
 #include "horizontal/horizontal_kernels.h"
 #include "lorvex.h"
 #include "rectangle/rectangle.h"
+#include "vertical/straight_kernels.h"
 #include "vertical/vertical_kernels.h"
 
 namespace lorvex::rectangle {
@@ -40,25 +44,46 @@ int32_t trunc_f32(float v)
 }
 
 // Chooses the tables for the pairing of the two images; false to refuse.
+// Sources of the two 4:2:2 formats pair freely with destinations of the two;
+// RGBQ and ALPHA pair only with themselves. The vertical table depends on the
+// source alone; the horizontal table on the destination's layout and on which
+// side has alpha, since the line buffer holds every source in one unit.
 bool pair_formats(Call& k, const Surface& dst, const Surface& src)
 {
     if ((src.alpha_format != ALPHA_NONE && src.alpha_format != ALPHA_W12B) ||
         (dst.alpha_format != ALPHA_NONE && dst.alpha_format != ALPHA_W12B))
         return false;
-    const bool src_alpha = src.alpha_format == ALPHA_W12B;
-    const bool dst_alpha = dst.alpha_format == ALPHA_W12B;
-    // Alpha planes are served by a later version of the library.
-    if (src_alpha || dst_alpha) return false;
+    const bool sa = src.alpha_format == ALPHA_W12B;
+    const bool da = dst.alpha_format == ALPHA_W12B;
+    // A source counts as straight only at 1.
+    const bool straight = sa && src.alpha_mode == ALPHA_MODE_STRAIGHT;
+    k.has_alpha = sa ? 1 : 0;
 
-    const bool src422 = src.format == FORMAT_YUY2 || src.format == FORMAT_W210;
-    if (src422) {
+    // Premultiplied alpha is filtered in a pass of its own, which can
+    // overshoot: every sample leaving the buffer is then limited.
+    const auto colour = [&](const VerticalKernelTable& plain, const VerticalKernelTable& straight_table) {
+        k.vtable = straight ? &straight_table : &plain;
+        if (sa && !straight) {
+            k.alpha_vtable = &V_ALPHA;
+            k.ctx.clamp = 1;
+        }
+    };
+    const auto horizontal = [&](const HorizontalKernelTable& plain, const HorizontalKernelTable& dest_alpha,
+                                const HorizontalKernelTable& src_alpha, const HorizontalKernelTable& both) {
+        k.htable = sa ? (da ? &both : &src_alpha) : (da ? &dest_alpha : &plain);
+    };
+
+    if (src.format == FORMAT_YUY2 || src.format == FORMAT_W210) {
         if (dst.format == FORMAT_YUY2)
-            k.htable = &H_YUY2;
+            horizontal(H_YUY2, H_YUY2_DA, H_YUY2_SA, H_YUY2_SA_DA);
         else if (dst.format == FORMAT_W210)
-            k.htable = &H_W210;
+            horizontal(H_W210, H_W210_DA, H_W210_SA, H_W210_SA_DA);
         else
             return false;
-        k.vtable = src.format == FORMAT_YUY2 ? &V_YUY2 : &V_W210;
+        if (src.format == FORMAT_YUY2)
+            colour(V_YUY2, V_YUY2_STRAIGHT);
+        else
+            colour(V_W210, V_W210_STRAIGHT);
         k.pixel_words = 2;
         k.chroma_factor = 1;
         k.chroma_spacing = 2;
@@ -67,9 +92,17 @@ bool pair_formats(Call& k, const Surface& dst, const Surface& src)
         return true;
     }
     if (src.format == FORMAT_RGBQ && dst.format == FORMAT_RGBQ) {
-        k.vtable = &V_RGBQ;
-        k.htable = &H_RGBQ;
+        colour(V_RGBQ, V_RGBQ_STRAIGHT);
+        horizontal(H_RGBQ, H_RGBQ_DA, H_RGBQ_SA, H_RGBQ_SA_DA);
         k.pixel_words = 4;
+        k.chroma_factor = 0;
+        k.chroma_spacing = 1;
+        return true;
+    }
+    if (src.format == FORMAT_ALPHA && dst.format == FORMAT_ALPHA && sa && da) {
+        k.vtable = &V_ALPHA;
+        k.htable = &H_ALPHA;
+        k.pixel_words = 0;
         k.chroma_factor = 0;
         k.chroma_spacing = 1;
         return true;

@@ -360,7 +360,7 @@ bool draw_lines(Call& k, const Plan& plan)
     const int32_t vs = (k.flags.vsoften_numerator * (vstep16 >> 12)) >> 3;
     const VerticalChoice v = choose_vertical(k.flags.vfilter, vs, vstep16);
 
-    if (v.loop == Loop::edge && (*k.vtable)[vslot::edge] == nullptr) return false;
+    if (v.loop == Loop::edge && ((*k.vtable)[vslot::edge] == nullptr || k.alpha_vtable)) return false;
     if (v.clamp) c.clamp = 1;
     c.vbank = v.bank;
     c.src_stride = k.src_stride;

@@ -46,6 +46,11 @@ struct SrcYuy2 {
     static constexpr int buffer_shift = 5;
     static constexpr int sum_shift = 9;
     static constexpr int box16_limit = 126;  // 126 * 255 = 32130
+    // Premultiplying: ((v - offset) * a) >> premul_shift, relative to black or
+    // neutral, which stand at 512 and 4096 in the buffer at any alpha.
+    static constexpr int luma_offset = 16, chroma_offset = 128;
+    static constexpr int luma_base = 512, chroma_base = 4096;
+    static constexpr int premul_shift = 7;
 };
 
 struct SrcW210 {
@@ -56,6 +61,9 @@ struct SrcW210 {
     static constexpr int buffer_shift = 3;
     static constexpr int sum_shift = 11;
     static constexpr int box16_limit = 30;  // 30 * 1023 = 30690
+    static constexpr int luma_offset = 64, chroma_offset = 512;
+    static constexpr int luma_base = 512, chroma_base = 4096;
+    static constexpr int premul_shift = 9;
 };
 
 struct SrcRgbq {
@@ -66,6 +74,9 @@ struct SrcRgbq {
     static constexpr int buffer_shift = 5;
     static constexpr int sum_shift = 9;
     static constexpr int box16_limit = 126;
+    static constexpr int luma_offset = 0, chroma_offset = 0;  // no offsets
+    static constexpr int luma_base = 0, chroma_base = 0;
+    static constexpr int premul_shift = 7;
 };
 
 // The second plane alone (alpha words, 4096 = 1.0), into `line_a`.
@@ -84,16 +95,23 @@ struct SrcAlpha {
 //   parity_mask: the address bit that tells an even pixel of a pair from an
 //     odd one (bit 1 for YUY2, bit 2 for W210); 0 where there are no pairs.
 // ---------------------------------------------------------------------------
+//   colour_samples: samples per pixel computed from the buffer's colour
+//     section (4:2:2: the luma; chroma comes with the even pixel);
+//   alpha_only: the image is the second plane.
 struct DstYuy2 : Depth8 {
     static constexpr int bytes_per_pixel = 2;
     static constexpr bool pairs = true;
     static constexpr uintptr_t parity_mask = 2;
+    static constexpr int colour_samples = 1;
+    static constexpr bool alpha_only = false;
 };
 
 struct DstW210 : Depth10 {
     static constexpr int bytes_per_pixel = 4;
     static constexpr bool pairs = true;
     static constexpr uintptr_t parity_mask = 4;
+    static constexpr int colour_samples = 1;
+    static constexpr bool alpha_only = false;
 };
 
 struct DstRgbq : Depth8 {
@@ -102,30 +120,50 @@ struct DstRgbq : Depth8 {
     static constexpr uintptr_t parity_mask = 0;
     static constexpr int luma_offset = 0;  // RGBQ has no offsets
     static constexpr int chroma_offset = 0;
+    static constexpr int colour_samples = 4;
+    static constexpr bool alpha_only = false;
+};
+
+// An image that is alpha alone: the destination's second plane, u16 words.
+struct DstAlpha {
+    using sample = uint16_t;
+    static constexpr int bytes_per_pixel = 2;
+    static constexpr bool pairs = false;
+    static constexpr uintptr_t parity_mask = 0;
+    static constexpr int luma_offset = 0, chroma_offset = 0;
+    static constexpr int max = 65535;
+    static constexpr int buffer_shift = 2;
+    static constexpr int colour_samples = 0;
+    static constexpr bool alpha_only = true;
 };
 
 // Rounding of buffer samples on their way out, by the sum of the weights that
 // mixed them: a single sample, weights summing to 0x10000 (linear and area
-// luma), 0x20000 (their chroma) and 16384 (bank coefficients).
-template <class D>
-constexpr int32_t out1(int32_t x)
+// luma), 0x20000 (their chroma) and 16384 (bank coefficients). Shift is the
+// unit of the result: 5 for 8-bit samples, 3 for 10-bit samples, 2 for alpha
+// in 1/4096, 0 for buffer units (and alpha in 1/16384).
+template <int Shift>
+constexpr int32_t mix1(int32_t x)
 {
-    return (x + (1 << (D::buffer_shift - 1))) >> D::buffer_shift;
+    if constexpr (Shift == 0)
+        return x;
+    else
+        return (x + (1 << (Shift - 1))) >> Shift;
 }
-template <class D>
-constexpr int64_t out_w16(int64_t s)
+template <int Shift>
+constexpr int32_t mix_w16(int64_t s)
 {
-    return (s + (int64_t(1) << (15 + D::buffer_shift))) >> (16 + D::buffer_shift);
+    return int32_t((s + (int64_t(1) << (15 + Shift))) >> (16 + Shift));
 }
-template <class D>
-constexpr int64_t out_w17(int64_t s)
+template <int Shift>
+constexpr int32_t mix_w17(int64_t s)
 {
-    return (s + (int64_t(1) << (16 + D::buffer_shift))) >> (17 + D::buffer_shift);
+    return int32_t((s + (int64_t(1) << (16 + Shift))) >> (17 + Shift));
 }
-template <class D>
-constexpr int32_t out_bank(int32_t s)
+template <int Shift>
+constexpr int32_t mix_bank(int32_t s)
 {
-    return (s + (1 << (13 + D::buffer_shift))) >> (14 + D::buffer_shift);
+    return (s + (1 << (13 + Shift))) >> (14 + Shift);
 }
 
 // Effective weight of a partly covered pixel. hc: horizontal coverage, 16.16,

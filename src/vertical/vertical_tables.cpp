@@ -2,6 +2,7 @@
 // order as in map_context.h.
 #include <utility>
 
+#include "vertical/straight_kernels.h"
 #include "vertical/vertical_kernels.h"
 
 namespace lorvex {
@@ -21,6 +22,21 @@ constexpr VerticalKernelTable make_table()
     };
 }
 
+template <class Src>
+constexpr VerticalKernelTable make_straight_table()
+{
+    return {
+        straight_pad_left_C<Src>,          straight_pad_right_C<Src>,         straight_one_line_C<Src>,
+        straight_one_line_C<Src>,          straight_box_C<Src>,               straight_linear_C<Src>,
+        straight_bank_C<Src, 1, false>,    straight_bank_C<Src, 2, false>,    straight_bank_C<Src, 3, false>,
+        straight_bank_C<Src, 4, false>,    straight_bank_C<Src, 5, false>,    straight_bank_C<Src, 6, false>,
+        straight_bank_C<Src, 7, false>,    straight_bank_C<Src, 8, false>,    straight_bank_C<Src, 1, true>,
+        straight_bank_C<Src, 2, true>,     straight_bank_C<Src, 3, true>,     straight_bank_C<Src, 4, true>,
+        straight_bank_C<Src, 5, true>,     straight_bank_C<Src, 6, true>,     straight_bank_C<Src, 7, true>,
+        straight_bank_C<Src, 8, true>,     nullptr,                           nullptr,
+    };
+}
+
 }  // namespace
 }  // namespace vertical
 
@@ -28,5 +44,8 @@ constexpr VerticalKernelTable V_YUY2 = vertical::make_table<SrcYuy2, vertical::e
 constexpr VerticalKernelTable V_W210 = vertical::make_table<SrcW210, nullptr>();
 constexpr VerticalKernelTable V_RGBQ = vertical::make_table<SrcRgbq, vertical::edge7_rgbq_C>();
 constexpr VerticalKernelTable V_ALPHA = vertical::make_table<SrcAlpha, nullptr>();
+constexpr VerticalKernelTable V_YUY2_STRAIGHT = vertical::make_straight_table<SrcYuy2>();
+constexpr VerticalKernelTable V_W210_STRAIGHT = vertical::make_straight_table<SrcW210>();
+constexpr VerticalKernelTable V_RGBQ_STRAIGHT = vertical::make_straight_table<SrcRgbq>();
 
 }  // namespace lorvex

@@ -18,7 +18,8 @@ constexpr BankId kAllBanks[] = {BANK_ID_LINEAR,   BANK_ID_SOFT,     BANK_ID_LANC
                                 BANK_ID_CUBIC,    BANK_ID_LANCZOS3, BANK_ID_LANCZOS4};
 constexpr const char* kNames[] = {"LINEAR", "SOFT", "LANCZOS2", "CUBIC", "LANCZOS3", "LANCZOS4"};
 
-// How far a rounded tap may stand from the exact one, and from its mirror.
+// A rounded tap stands less than kTapBound from the exact one, and at most
+// kMirrorBound from its mirror.
 constexpr double kTapBound = 1.0;
 constexpr int kMirrorBound = 1;
 
@@ -81,7 +82,7 @@ TEST(Banks, EveryPhaseFollowsTheFormula) {
                     if (std::fabs(offset(p, k)) >= extent) {
                         ASSERT_EQ(value, 0);
                     }
-                    ASSERT_LE(std::fabs(value - exact_tap(id, scale, p, k)), kTapBound);
+                    ASSERT_LT(std::fabs(value - exact_tap(id, scale, p, k)), kTapBound);
                 }
                 ASSERT_EQ(sum, 16384) << "BANK_" << kNames[id] << " scale " << scale << " phase " << p;
             }
