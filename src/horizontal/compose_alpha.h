@@ -79,7 +79,7 @@ struct AlphaOnlyFamilyT {
     template <class Dst, class Shape>
     static void region_pixel(const MapContext& c, uint16_t* d, uint16_t*, Px& px, int32_t w)
     {
-        px.a = (w * px.a + 2048) >> 12;
+        px.a = mul_round_wrap(w, px.a, 2048, 12);
         const int32_t D = *d;
         *d = uint16_t(c.tile ? D + px.a : (((4096 - px.a) * D + 2048) >> 12) + px.a);
     }

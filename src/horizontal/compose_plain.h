@@ -92,7 +92,7 @@ struct PlainFamily {
         if constexpr (!Dst::pairs) {
             if (c.tile) {
                 for (int e = 0; e < 4; ++e) {
-                    const int32_t sum = d[e] + ((px.s[e] * w + 8192) >> 14);
+                    const int32_t sum = int32_t(uint32_t(d[e]) + uint32_t(mul_round_wrap(px.s[e], w, 8192, 14)));
                     d[e] = typename Dst::sample(clamp_to(sum, 0, Dst::max));
                     px.s[e] = sum;
                 }

@@ -133,7 +133,7 @@ struct SourceAlphaFamily {
             const int32_t o = offset_of<Dst, Shape>(i);
             const int32_t D = d[Shape::at[i]], S = px.s[i];
             if (c.tile) {
-                const int32_t sum = D + (((S - o) * w + 8192) >> 14);
+                const int32_t sum = int32_t(uint32_t(D) + uint32_t(mul_round_wrap(S - o, w, 8192, 14)));
                 d[Shape::at[i]] = T(clamp_to(sum, 0, Dst::max));
                 if constexpr (!Dst::pairs) px.s[i] = sum;
             } else {

@@ -184,6 +184,15 @@ constexpr T clamp_to(T v, T lo, T hi)
     return v < lo ? lo : (v > hi ? hi : v);
 }
 
+// (a b + round) >> shift in 32 bits that wrap instead of overflowing: the
+// running sums of the tiled constant regions compound from pixel to pixel and,
+// with a level above 1.0, can outgrow 32 bits; they then wrap as 32-bit
+// arithmetic does.
+constexpr int32_t mul_round_wrap(int32_t a, int32_t b, int32_t round, int shift)
+{
+    return int32_t(uint32_t(a) * uint32_t(b) + uint32_t(round)) >> shift;
+}
+
 constexpr int16_t saturate_i16(int32_t v)
 {
     return int16_t(v < -32768 ? -32768 : (v > 32767 ? 32767 : v));
