@@ -13,12 +13,13 @@
 // and e is not tested. The tile sum is a 16-bit sum, never clamped.
 #pragma once
 
-#include <algorithm>
+#include "shared/isa.h"
 
 #include "horizontal/pixel.h"
 #include "shared/map_context.h"
 
 namespace lorvex::horizontal {
+inline namespace LORVEX_ISA_NAMESPACE {
 
 template <bool Bank>
 struct AlphaOnlyFamilyT {
@@ -72,7 +73,8 @@ struct AlphaOnlyFamilyT {
     template <class Dst>
     static bool region_setup(const MapContext&, Px& px)
     {
-        px.a = std::min((px.a + 2) >> 2, 4096);
+        px.a = (px.a + 2) >> 2;
+        if (px.a > 4096) px.a = 4096;
         return px.a >= 1;
     }
 
@@ -88,4 +90,5 @@ struct AlphaOnlyFamilyT {
 using AlphaOnlyFamily = AlphaOnlyFamilyT<false>;
 using AlphaOnlyBankFamily = AlphaOnlyFamilyT<true>;
 
+}  // namespace LORVEX_ISA_NAMESPACE
 }  // namespace lorvex::horizontal

@@ -27,10 +27,13 @@
 // is never clamped: in tile mode it adds up and may exceed 4096.
 #pragma once
 
+#include "shared/isa.h"
+
 #include "horizontal/pixel.h"
 #include "shared/map_context.h"
 
 namespace lorvex::horizontal {
+inline namespace LORVEX_ISA_NAMESPACE {
 
 struct DestAlphaFamily {
     static constexpr bool dest_alpha = true;
@@ -143,4 +146,5 @@ struct DestAlphaFamily {
     }
 };
 
+}  // namespace LORVEX_ISA_NAMESPACE
 }  // namespace lorvex::horizontal

@@ -19,10 +19,13 @@
 // low bits of the result.
 #pragma once
 
+#include "shared/isa.h"
+
 #include "horizontal/pixel.h"
 #include "shared/map_context.h"
 
 namespace lorvex::horizontal {
+inline namespace LORVEX_ISA_NAMESPACE {
 
 struct PlainFamily {
     static constexpr bool dest_alpha = false;
@@ -103,4 +106,5 @@ struct PlainFamily {
     }
 };
 
+}  // namespace LORVEX_ISA_NAMESPACE
 }  // namespace lorvex::horizontal

@@ -33,10 +33,13 @@
 // has no offsets and is clamped only in tile.
 #pragma once
 
+#include "shared/isa.h"
+
 #include "horizontal/pixel.h"
 #include "shared/map_context.h"
 
 namespace lorvex::horizontal {
+inline namespace LORVEX_ISA_NAMESPACE {
 
 struct SourceAlphaFamily {
     static constexpr bool dest_alpha = false;
@@ -196,4 +199,5 @@ struct SourceAlphaFastFamily : SourceAlphaFamily {
     }
 };
 
+}  // namespace LORVEX_ISA_NAMESPACE
 }  // namespace lorvex::horizontal

@@ -33,10 +33,13 @@
 // only when the new Dα is not 0. RGBQ samples all follow the luma rows.
 #pragma once
 
+#include "shared/isa.h"
+
 #include "horizontal/pixel.h"
 #include "shared/map_context.h"
 
 namespace lorvex::horizontal {
+inline namespace LORVEX_ISA_NAMESPACE {
 
 struct SourceDestAlphaFamily {
     static constexpr bool dest_alpha = true;
@@ -198,4 +201,5 @@ struct SourceDestAlphaFamily {
     }
 };
 
+}  // namespace LORVEX_ISA_NAMESPACE
 }  // namespace lorvex::horizontal

@@ -2,11 +2,14 @@
 // samples of one destination pixel, and where they go in the destination.
 #pragma once
 
+#include "shared/isa.h"
+
 #include <cstdint>
 
 #include "shared/formats.h"
 
 namespace lorvex::horizontal {
+inline namespace LORVEX_ISA_NAMESPACE {
 
 // The samples computed for one destination pixel. 4:2:2: s[0] luma, s[1] Cb,
 // s[2] Cr (chroma only on even pixels). RGBQ: s[0..3]. `a` is source alpha
@@ -47,4 +50,5 @@ constexpr int32_t offset_of(int i)
     return Shape::chroma[i] ? Dst::chroma_offset : Dst::luma_offset;
 }
 
+}  // namespace LORVEX_ISA_NAMESPACE
 }  // namespace lorvex::horizontal

@@ -23,11 +23,14 @@
 // RGBQ: the four samples of a pixel share the luma walk.
 #pragma once
 
+#include "shared/isa.h"
+
 #include "horizontal/pixel.h"
 #include "horizontal/sample_spec.h"
 #include "shared/map_context.h"
 
 namespace lorvex::horizontal {
+inline namespace LORVEX_ISA_NAMESPACE {
 
 template <class Spec>
 struct AreaSampler {
@@ -138,4 +141,5 @@ struct AreaSampler {
     void advance() {}
 };
 
+}  // namespace LORVEX_ISA_NAMESPACE
 }  // namespace lorvex::horizontal

@@ -6,7 +6,10 @@
 // (1/16384), 2 (1/4096) or none.
 #pragma once
 
+#include "shared/isa.h"
+
 namespace lorvex::horizontal {
+inline namespace LORVEX_ISA_NAMESPACE {
 
 constexpr int kNoAlpha = -1;
 
@@ -25,4 +28,5 @@ struct SampleSpec {
 template <class Dst, int AlphaShift = kNoAlpha>
 using StoredSpec = SampleSpec<Dst, Dst::buffer_shift, AlphaShift>;
 
+}  // namespace LORVEX_ISA_NAMESPACE
 }  // namespace lorvex::horizontal

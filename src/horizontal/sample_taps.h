@@ -22,11 +22,14 @@
 // strip plan leaves that margin.
 #pragma once
 
+#include "shared/isa.h"
+
 #include "horizontal/pixel.h"
 #include "horizontal/sample_spec.h"
 #include "shared/map_context.h"
 
 namespace lorvex::horizontal {
+inline namespace LORVEX_ISA_NAMESPACE {
 
 template <class Spec>
 struct LinearSampler {
@@ -117,4 +120,5 @@ struct BankSampler {
     void advance() { pos += step; }
 };
 
+}  // namespace LORVEX_ISA_NAMESPACE
 }  // namespace lorvex::horizontal

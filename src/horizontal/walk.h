@@ -24,12 +24,13 @@
 // always in the kernels whose sampler says so.
 #pragma once
 
-#include <algorithm>
+#include "shared/isa.h"
 
 #include "horizontal/pixel.h"
 #include "shared/map_context.h"
 
 namespace lorvex::horizontal {
+inline namespace LORVEX_ISA_NAMESPACE {
 
 template <class Dst>
 inline typename Dst::sample* dst_pixel(const MapContext& c, int32_t x)
@@ -113,7 +114,7 @@ void main_kernel_C(const MapContext& c, const StripRecord& s)
                 }
             }
             if (rem == 0) return;
-            hc = std::min(rem, 0x10000);
+            hc = (rem < 0x10000 ? rem : 0x10000);
         }
         const bool even = is_even<Dst>(d);
         smp.sample(px, even, false);
@@ -128,7 +129,7 @@ void main_kernel_C(const MapContext& c, const StripRecord& s)
         if (rem == 0) return;
         ++x;
         d = dst_pixel<Dst>(c, x);
-        hc = std::min(rem, 0x10000);
+        hc = (rem < 0x10000 ? rem : 0x10000);
     }
 }
 
@@ -182,7 +183,7 @@ void region_C(const MapContext& c, const StripRecord& s)
             Family::template region_pixel<Dst, LumaShape<Dst>>(c, d, dst_alpha<Family>(c, x), px, w);
         rem -= hc;
         if (rem <= 0) return;
-        hc = std::min(rem, 0x10000);
+        hc = (rem < 0x10000 ? rem : 0x10000);
     }
 }
 
@@ -190,4 +191,5 @@ void region_C(const MapContext& c, const StripRecord& s)
 // constant regions of such a call are drawn.
 inline void empty_C(const MapContext&, const StripRecord&) {}
 
+}  // namespace LORVEX_ISA_NAMESPACE
 }  // namespace lorvex::horizontal

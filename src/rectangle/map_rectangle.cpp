@@ -17,6 +17,7 @@
 #include "horizontal/horizontal_kernels.h"
 #include "lorvex.h"
 #include "rectangle/rectangle.h"
+#include "shared/simd.h"
 #include "vertical/straight_kernels.h"
 #include "vertical/vertical_kernels.h"
 
@@ -127,6 +128,10 @@ extern "C" LORVEX_API void map_rectangle(const Surface* dest, float x0, float y0
     if (k.ctx.level == 0) return;
     if (line_period <= 0) return;
     if (!pair_formats(k, *dest, *source)) return;
+    // The vector level, once for the whole call.
+    const SimdLevel simd = simd_level();
+    k.vtable = vertical_table_for(k.vtable, simd);
+    if (k.alpha_vtable) k.alpha_vtable = vertical_table_for(k.alpha_vtable, simd);
 
     LineBuffer buffer;  // on the stack, as all state of the call
     // The lead-in before the buffer is read only by the right region of a

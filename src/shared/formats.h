@@ -5,6 +5,8 @@
 
 #include <cstdint>
 
+#include "shared/isa.h"
+
 namespace lorvex {
 
 constexpr int kLineBufferElements = 16384;
@@ -137,6 +139,8 @@ struct DstAlpha {
     static constexpr bool alpha_only = true;
 };
 
+inline namespace LORVEX_ISA_NAMESPACE {
+
 // Rounding of buffer samples on their way out, by the sum of the weights that
 // mixed them: a single sample, weights summing to 0x10000 (linear and area
 // luma), 0x20000 (their chroma) and 16384 (bank coefficients). Shift is the
@@ -198,4 +202,5 @@ constexpr int16_t saturate_i16(int32_t v)
     return int16_t(v < -32768 ? -32768 : (v > 32767 ? 32767 : v));
 }
 
+}  // namespace LORVEX_ISA_NAMESPACE
 }  // namespace lorvex

@@ -18,9 +18,12 @@
 // its own alpha.
 #pragma once
 
+#include "shared/isa.h"
+
 #include "vertical/vertical_kernels.h"
 
 namespace lorvex::vertical {
+inline namespace LORVEX_ISA_NAMESPACE {
 
 // Premultiplied sample of element e (relative to the source line start) of a
 // line, with its alpha line.
@@ -141,6 +144,7 @@ void straight_bank_C(const MapContext& ctx, const StripRecord& s)
         [&](int32_t i) { return int32_t(row[7 + i + 1 - T]); });
 }
 
+}  // namespace LORVEX_ISA_NAMESPACE
 }  // namespace lorvex::vertical
 
 namespace lorvex {

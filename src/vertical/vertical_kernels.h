@@ -20,12 +20,15 @@
 // tables of vertical_tables.cpp.
 #pragma once
 
+#include "shared/isa.h"
+
 #include <cstdint>
 
 #include "shared/formats.h"
 #include "shared/map_context.h"
 
 namespace lorvex::vertical {
+inline namespace LORVEX_ISA_NAMESPACE {
 
 // Where a kernel reads and writes, for one strip.
 template <class Src>
@@ -209,6 +212,8 @@ void bank_C(const MapContext& ctx, const StripRecord& s)
     }
 }
 
+}  // namespace LORVEX_ISA_NAMESPACE
+
 // Slot 22: the edge-adaptive interpolator of kind 7 (byte layouts only).
 void edge7_yuy2_C(const MapContext& ctx, const StripRecord& s);
 void edge7_rgbq_C(const MapContext& ctx, const StripRecord& s);
@@ -216,8 +221,14 @@ void edge7_rgbq_C(const MapContext& ctx, const StripRecord& s);
 }  // namespace lorvex::vertical
 
 namespace lorvex {
+enum class SimdLevel : int;
+
 extern const VerticalKernelTable V_YUY2;
 extern const VerticalKernelTable V_W210;
 extern const VerticalKernelTable V_RGBQ;
 extern const VerticalKernelTable V_ALPHA;
+
+// The twin of a table whose kernels use the vectors of `level`, where one
+// exists; the table itself otherwise.
+const VerticalKernelTable* vertical_table_for(const VerticalKernelTable* table, SimdLevel level);
 }  // namespace lorvex

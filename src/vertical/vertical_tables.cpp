@@ -2,6 +2,7 @@
 // order as in map_context.h.
 #include <utility>
 
+#include "shared/simd.h"
 #include "vertical/straight_kernels.h"
 #include "vertical/vertical_kernels.h"
 
@@ -47,5 +48,37 @@ constexpr VerticalKernelTable V_ALPHA = vertical::make_table<SrcAlpha, nullptr>(
 constexpr VerticalKernelTable V_YUY2_STRAIGHT = vertical::make_straight_table<SrcYuy2>();
 constexpr VerticalKernelTable V_W210_STRAIGHT = vertical::make_straight_table<SrcW210>();
 constexpr VerticalKernelTable V_RGBQ_STRAIGHT = vertical::make_straight_table<SrcRgbq>();
+
+}  // namespace lorvex
+
+namespace lorvex {
+
+#if defined(LORVEX_HAVE_X86_KERNELS)
+extern const VerticalKernelTable V_YUY2_SSE41, V_W210_SSE41, V_RGBQ_SSE41, V_ALPHA_SSE41;
+extern const VerticalKernelTable V_YUY2_AVX2, V_W210_AVX2, V_RGBQ_AVX2, V_ALPHA_AVX2;
+#endif
+
+const VerticalKernelTable* vertical_table_for(const VerticalKernelTable* table, SimdLevel level)
+{
+#if defined(LORVEX_HAVE_X86_KERNELS)
+    struct Twins {
+        const VerticalKernelTable* scalar;
+        const VerticalKernelTable* sse41;
+        const VerticalKernelTable* avx2;
+    };
+    static constexpr Twins twins[] = {
+        {&V_YUY2, &V_YUY2_SSE41, &V_YUY2_AVX2},
+        {&V_W210, &V_W210_SSE41, &V_W210_AVX2},
+        {&V_RGBQ, &V_RGBQ_SSE41, &V_RGBQ_AVX2},
+        {&V_ALPHA, &V_ALPHA_SSE41, &V_ALPHA_AVX2},
+    };
+    if (level != SimdLevel::scalar)
+        for (const Twins& t : twins)
+            if (t.scalar == table) return level == SimdLevel::avx2 ? t.avx2 : t.sse41;
+#else
+    (void)level;
+#endif
+    return table;
+}
 
 }  // namespace lorvex

@@ -1,0 +1,14 @@
+// The instruction set a source file is compiled for. Code in headers that
+// vector source files include is placed in an inline namespace named after it,
+// so that the same template compiled for two instruction sets gives two
+// distinct functions, and the linker never takes the vector build of a helper
+// for a caller on a processor without those instructions.
+#pragma once
+
+#if defined(LORVEX_ISA_AVX2)
+#define LORVEX_ISA_NAMESPACE isa_avx2
+#elif defined(LORVEX_ISA_SSE41)
+#define LORVEX_ISA_NAMESPACE isa_sse41
+#else
+#define LORVEX_ISA_NAMESPACE isa_scalar
+#endif

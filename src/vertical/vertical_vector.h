@@ -1,0 +1,199 @@
+// Vector forms of the vertical kernels, one template for both vector widths
+// (Vec of shared/vec.h). Each gives the same bytes as its scalar twin in
+// vertical_kernels.h / straight_kernels.h: the element loop runs a register of
+// elements at a time with 16-bit multiply-add into 32-bit lanes, the same
+// truncating shift and the same saturation, and hands the last elements that
+// do not fill a register to the scalar form of the same kernel. Loads stay
+// within the elements the scalar form reads.
+//
+// 16-bit sample lanes hold bytes, 10-bit words and alpha words as signed
+// values: words must stay below 32768, as every legal sample does.
+#pragma once
+
+#include "shared/vec.h"
+#include "vertical/straight_kernels.h"
+#include "vertical/vertical_kernels.h"
+
+namespace lorvex::vertical {
+inline namespace LORVEX_ISA_NAMESPACE {
+
+template <class Src>
+inline typename Vec::reg load_samples(const uint8_t* line, int32_t e)
+{
+    if constexpr (sizeof(typename Src::sample) == 1)
+        return Vec::load_u8(line + e);
+    else
+        return Vec::load_u16(reinterpret_cast<const uint16_t*>(line) + e);
+}
+
+// The scalar kernel run over elements [from, count) of the strip: the part
+// the vector loop left. The scalar kernels take a whole strip, so the tail is
+// expressed as the same strip with its range cut, which is exact because every
+// element is computed by itself.
+template <class Src>
+inline StripRecord tail_strip(const StripRecord& s, int32_t from_element)
+{
+    constexpr int E = Src::elements_per_pixel;
+    // Tails start on a whole pixel (vector lanes are a multiple of E); in pairs
+    // the range's end was already rounded up to even, so it stays whole too.
+    StripRecord t = s;
+    const int32_t px = from_element / E;
+    t.src_first = s.src_first + px;
+    t.pad_left = s.pad_left + px;
+    return t;
+}
+
+// Weighted sum of n lines with 16-bit weights w[k] (pairs of lines at a time),
+// a register of elements starting at element e of the source lines.
+template <class Src, int N>
+inline typename Vec::reg weighted(const uint8_t* const* rows, const int32_t* pair_coef, int32_t e)
+{
+    using V = Vec;
+    typename V::reg lo = V::zero(), hi = V::zero();
+    for (int k = 0; k < N; k += 2) {
+        const typename V::reg a = load_samples<Src>(rows[k], e), b = load_samples<Src>(rows[k + 1], e);
+        const typename V::reg c = V::set1_32(pair_coef[k / 2]);
+        lo = V::add32(lo, V::madd(V::unpack_lo16(a, b), c));
+        hi = V::add32(hi, V::madd(V::unpack_hi16(a, b), c));
+    }
+    return V::packs32(V::srai32(lo, Src::sum_shift), V::srai32(hi, Src::sum_shift));
+}
+
+inline int32_t coef_pair(int32_t c0, int32_t c1)
+{
+    return int32_t((uint32_t(uint16_t(c1)) << 16) | uint16_t(c0));
+}
+
+// Slots 6..21: 2T taps by stride or through the pointer array.
+template <class Src, int T, bool ByPointer>
+void bank_V(const MapContext& ctx, const StripRecord& s)
+{
+    const Span<Src> sp(ctx, s);
+    const LineSet& lines = src_lines<Src>(ctx);
+    const int32_t stride = src_stride<Src>(ctx);
+    const int16_t* row = ctx.vbank + ctx.vphase * 16;
+    const uint8_t* rows[2 * T];
+    int32_t coef[T];
+    for (int k = 1 - T; k <= T; ++k)
+        rows[k + T - 1] = ByPointer ? lines[k] : lines[0] + ptrdiff_t(stride) * k;
+    for (int m = 0; m < T; ++m) coef[m] = coef_pair(row[7 + 1 - T + 2 * m], row[7 + 2 - T + 2 * m]);
+    int32_t e = 0;
+    for (; e + Vec::lanes16 <= sp.count; e += Vec::lanes16)
+        Vec::store_i16(sp.out + e, weighted<Src, 2 * T>(rows, coef, sp.first + e));
+    if (e < sp.count) bank_C<Src, T, ByPointer>(ctx, tail_strip<Src>(s, e));
+}
+
+// Slots 2 and 3: one line into buffer units.
+template <class Src>
+void one_line_V(const MapContext& ctx, const StripRecord& s)
+{
+    const Span<Src> sp(ctx, s);
+    const uint8_t* line = src_lines<Src>(ctx)[0];
+    int32_t e = 0;
+    for (; e + Vec::lanes16 <= sp.count; e += Vec::lanes16)
+        Vec::store_i16(sp.out + e, Vec::slli16(load_samples<Src>(line, sp.first + e), Src::buffer_shift));
+    if (e < sp.count) one_line_C<Src>(ctx, tail_strip<Src>(s, e));
+}
+
+// Slot 5: two lines with weights 16384 - w and w.
+template <class Src>
+void linear_V(const MapContext& ctx, const StripRecord& s)
+{
+    const int32_t w = ctx.vphase >> 2;
+    if (w == 0) {
+        one_line_V<Src>(ctx, s);
+        return;
+    }
+    const Span<Src> sp(ctx, s);
+    const LineSet& lines = src_lines<Src>(ctx);
+    const uint8_t* rows[2] = {lines[0], lines[0] + src_stride<Src>(ctx)};
+    const int32_t coef[1] = {coef_pair(16384 - w, w)};
+    int32_t e = 0;
+    for (; e + Vec::lanes16 <= sp.count; e += Vec::lanes16)
+        Vec::store_i16(sp.out + e, weighted<Src, 2>(rows, coef, sp.first + e));
+    if (e < sp.count) linear_C<Src>(ctx, tail_strip<Src>(s, e));
+}
+
+// Slot 4: the box. The middle lines are summed in 16-bit lanes while that sum
+// fits, else in 32-bit lanes; then one multiply each.
+template <class Src>
+void box_V(const MapContext& ctx, const StripRecord& s)
+{
+    using V = Vec;
+    const int32_t mid = ctx.box_mid, wl = ctx.box_last;
+    if (mid == 0 && wl == 0) {
+        one_line_V<Src>(ctx, s);
+        return;
+    }
+    const Span<Src> sp(ctx, s);
+    const LineSet& lines = src_lines<Src>(ctx);
+    const int32_t stride = src_stride<Src>(ctx);
+    const uint8_t* l0 = lines[0];
+    const uint8_t* llast = lines[0] + ptrdiff_t(stride) * (mid + 1);
+    const typename V::reg c_first_last = V::set1_32(coef_pair(ctx.box_first, wl));
+    int32_t e = 0;
+    if (mid == 0) {
+        for (; e + V::lanes16 <= sp.count; e += V::lanes16) {
+            const typename V::reg a = load_samples<Src>(l0, sp.first + e), b = load_samples<Src>(llast, sp.first + e);
+            const typename V::reg lo = V::madd(V::unpack_lo16(a, b), c_first_last);
+            const typename V::reg hi = V::madd(V::unpack_hi16(a, b), c_first_last);
+            V::store_i16(sp.out + e, V::packs32(V::srai32(lo, Src::sum_shift), V::srai32(hi, Src::sum_shift)));
+        }
+    } else if (mid <= Src::box16_limit) {
+        const typename V::reg c_mid = V::set1_32(coef_pair(ctx.box_step, 0));
+        for (; e + V::lanes16 <= sp.count; e += V::lanes16) {
+            typename V::reg m = V::zero();
+            for (int32_t k = 1; k <= mid; ++k)
+                m = V::add16(m, load_samples<Src>(lines[0] + ptrdiff_t(stride) * k, sp.first + e));
+            const typename V::reg a = load_samples<Src>(l0, sp.first + e), b = load_samples<Src>(llast, sp.first + e);
+            const typename V::reg z = V::zero();
+            const typename V::reg lo = V::add32(V::madd(V::unpack_lo16(a, b), c_first_last),
+                                                V::madd(V::unpack_lo16(m, z), c_mid));
+            const typename V::reg hi = V::add32(V::madd(V::unpack_hi16(a, b), c_first_last),
+                                                V::madd(V::unpack_hi16(m, z), c_mid));
+            V::store_i16(sp.out + e, V::packs32(V::srai32(lo, Src::sum_shift), V::srai32(hi, Src::sum_shift)));
+        }
+    } else {
+        const typename V::reg wm = V::set1_32(ctx.box_step), w0 = V::set1_32(ctx.box_first),
+                              wlv = V::set1_32(wl);
+        for (; e + V::lanes16 <= sp.count; e += V::lanes16) {
+            typename V::reg mlo = V::zero(), mhi = V::zero();
+            for (int32_t k = 1; k <= mid; ++k) {
+                const typename V::reg v = load_samples<Src>(lines[0] + ptrdiff_t(stride) * k, sp.first + e);
+                mlo = V::add32(mlo, V::widen_lo_u16(v));
+                mhi = V::add32(mhi, V::widen_hi_u16(v));
+            }
+            const typename V::reg a = load_samples<Src>(l0, sp.first + e), b = load_samples<Src>(llast, sp.first + e);
+            // In element order: widened samples times the weights.
+            const typename V::reg slo = V::add32(V::add32(V::mullo32(V::widen_lo_u16(a), w0), V::mullo32(mlo, wm)),
+                                                 V::mullo32(V::widen_lo_u16(b), wlv));
+            const typename V::reg shi = V::add32(V::add32(V::mullo32(V::widen_hi_u16(a), w0), V::mullo32(mhi, wm)),
+                                                 V::mullo32(V::widen_hi_u16(b), wlv));
+            V::store_i16(sp.out + e, V::narrow_s32(V::srai32(slo, Src::sum_shift), V::srai32(shi, Src::sum_shift)));
+        }
+    }
+    if (e < sp.count) box_C<Src>(ctx, tail_strip<Src>(s, e));
+}
+
+}  // namespace LORVEX_ISA_NAMESPACE
+}  // namespace lorvex::vertical
+
+namespace lorvex::vertical {
+inline namespace LORVEX_ISA_NAMESPACE {
+
+// A plain table with the vector kernels in the slots they serve.
+template <class Src, Kernel Edge>
+constexpr VerticalKernelTable make_vector_table()
+{
+    return {
+        pad_left_C<Src>,       pad_right_C<Src>,      one_line_V<Src>,       one_line_V<Src>,
+        box_V<Src>,            linear_V<Src>,         bank_V<Src, 1, false>, bank_V<Src, 2, false>,
+        bank_V<Src, 3, false>, bank_V<Src, 4, false>, bank_V<Src, 5, false>, bank_V<Src, 6, false>,
+        bank_V<Src, 7, false>, bank_V<Src, 8, false>, bank_V<Src, 1, true>,  bank_V<Src, 2, true>,
+        bank_V<Src, 3, true>,  bank_V<Src, 4, true>,  bank_V<Src, 5, true>,  bank_V<Src, 6, true>,
+        bank_V<Src, 7, true>,  bank_V<Src, 8, true>,  Edge,                  nullptr,
+    };
+}
+
+}  // namespace LORVEX_ISA_NAMESPACE
+}  // namespace lorvex::vertical
