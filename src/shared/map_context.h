@@ -107,10 +107,13 @@ constexpr int left = 0, right = 1, area = 2, linear = 3, bank = 4 /* + T */, edg
 
 // The line buffer. A few elements before `line` are part of the storage, so
 // that the right region of a one-pair strip of an odd-width source, which
-// reads the chroma element before the pair, reads defined memory.
+// reads the chroma element before the pair, reads defined memory; a few after
+// its end let the vector tap kernels load whole registers around a window
+// whose last elements they weigh by zero.
 struct alignas(64) LineBuffer {
     static constexpr int kLead = 32;
-    int16_t storage[kLead + kLineBufferElements];
+    static constexpr int kTail = 64;
+    int16_t storage[kLead + kLineBufferElements + kTail];
     int16_t* line() { return storage + kLead; }
 };
 
