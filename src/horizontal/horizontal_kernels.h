@@ -7,6 +7,8 @@
 #include "shared/map_context.h"
 
 namespace lorvex {
+enum class SimdLevel : int;
+
 extern const HorizontalKernelTable H_YUY2;
 extern const HorizontalKernelTable H_YUY2_DA;
 extern const HorizontalKernelTable H_YUY2_SA;
@@ -20,4 +22,8 @@ extern const HorizontalKernelTable H_RGBQ_DA;
 extern const HorizontalKernelTable H_RGBQ_SA;
 extern const HorizontalKernelTable H_RGBQ_SA_DA;
 extern const HorizontalKernelTable H_ALPHA;
+
+// The twin of a table whose samplers use the vectors of `level`, where one
+// exists; the table itself otherwise.
+const HorizontalKernelTable* horizontal_table_for(const HorizontalKernelTable* table, SimdLevel level);
 }  // namespace lorvex

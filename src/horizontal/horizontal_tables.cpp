@@ -3,85 +3,46 @@
 // of walk.h with a sampler (area, linear, bank of 2(T + 1) taps) and a family.
 #include "horizontal/horizontal_kernels.h"
 
-#include "horizontal/compose_alpha.h"
-#include "horizontal/compose_da.h"
-#include "horizontal/compose_plain.h"
-#include "horizontal/compose_sa.h"
-#include "horizontal/compose_sa_da.h"
-#include "horizontal/sample_area.h"
-#include "horizontal/sample_taps.h"
-#include "horizontal/walk.h"
+#include "horizontal/table_builder.h"
+#include "shared/simd.h"
 
 namespace lorvex {
-namespace horizontal {
-namespace {
 
-// The kernels of one table. Samples in stored depth; alpha in the unit the
-// family reads (AlphaShift: 0 for 1/16384, 2 for 1/4096, kNoAlpha).
-template <class Dst, class Family, int AlphaShift, class BankFamily = Family>
-struct Kernels {
-    using Spec = StoredSpec<Dst, AlphaShift>;
-    // The area walk of RGBQ runs in steps of two pixels, like the pairs.
-    static constexpr bool kAreaPairs = !Dst::alpha_only;
+using Scalar = horizontal::TableSet<horizontal::ScalarBank>;
 
-    static constexpr Kernel left = region_C<Dst, Family, false>;
-    static constexpr Kernel right = region_C<Dst, Family, true>;
-    static constexpr Kernel area = main_kernel_C<Dst, AreaSampler<Spec>, Family, kAreaPairs>;
-    static constexpr Kernel linear = main_kernel_C<Dst, LinearSampler<Spec>, Family, Dst::pairs>;
-    template <int T>
-    static constexpr Kernel bank = main_kernel_C<Dst, BankSampler<Spec, T>, BankFamily, Dst::pairs>;
-};
+constexpr HorizontalKernelTable H_YUY2 = Scalar::tables[0];
+constexpr HorizontalKernelTable H_YUY2_DA = Scalar::tables[1];
+constexpr HorizontalKernelTable H_YUY2_SA = Scalar::tables[2];
+constexpr HorizontalKernelTable H_YUY2_SA_DA = Scalar::tables[3];
+constexpr HorizontalKernelTable H_W210 = Scalar::tables[4];
+constexpr HorizontalKernelTable H_W210_DA = Scalar::tables[5];
+constexpr HorizontalKernelTable H_W210_SA = Scalar::tables[6];
+constexpr HorizontalKernelTable H_W210_SA_DA = Scalar::tables[7];
+constexpr HorizontalKernelTable H_RGBQ = Scalar::tables[8];
+constexpr HorizontalKernelTable H_RGBQ_DA = Scalar::tables[9];
+constexpr HorizontalKernelTable H_RGBQ_SA = Scalar::tables[10];
+constexpr HorizontalKernelTable H_RGBQ_SA_DA = Scalar::tables[11];
+constexpr HorizontalKernelTable H_ALPHA = Scalar::tables[12];
 
-// The source-alpha tables: slots 2 to 5 choose per call between the fast form
-// (colour in buffer units, alpha in 1/16384) and the general form.
-template <class Dst>
-struct SourceAlphaKernels : Kernels<Dst, SourceAlphaFamily, 0> {
-    using Base = Kernels<Dst, SourceAlphaFamily, 0>;
-    using Spec = typename Base::Spec;
-    using FastArea = SampleSpec<Dst, 0, 0, true>;
-    using Fast = SampleSpec<Dst, 0, 0>;
+#if defined(LORVEX_HAVE_X86_KERNELS)
+extern const HorizontalKernelTable H_TABLES_SSE41[13];
+extern const HorizontalKernelTable H_TABLES_AVX2[13];
+#endif
 
-    static constexpr Kernel area = fast_or_general_C<Dst, AreaSampler<Spec>, AreaSampler<FastArea>,
-                                                     SourceAlphaFamily, SourceAlphaFastFamily, true>;
-    static constexpr Kernel linear = fast_or_general_C<Dst, LinearSampler<Spec>, LinearSampler<Fast>,
-                                                       SourceAlphaFamily, SourceAlphaFastFamily, Dst::pairs>;
-    template <int T>
-    static constexpr Kernel bank =
-        T <= 1 ? fast_or_general_C<Dst, BankSampler<Spec, T>, BankSampler<Fast, T>, SourceAlphaFamily,
-                                   SourceAlphaFastFamily, Dst::pairs>
-               : Base::template bank<T>;
-};
-
-// Kind 7's empty main kernel stands in slot 12 where `HasEdge`.
-template <class K, bool HasEdge = true>
-constexpr HorizontalKernelTable make_table()
+const HorizontalKernelTable* horizontal_table_for(const HorizontalKernelTable* table, SimdLevel level)
 {
-    return {
-        K::left,        K::right,       K::area,        K::linear,      K::template bank<0>,
-        K::template bank<1>, K::template bank<2>, K::template bank<3>, K::template bank<4>,
-        K::template bank<5>, K::template bank<6>, K::template bank<7>, HasEdge ? empty_C : nullptr,
-        nullptr,
+#if defined(LORVEX_HAVE_X86_KERNELS)
+    static constexpr const HorizontalKernelTable* scalar[13] = {
+        &H_YUY2, &H_YUY2_DA, &H_YUY2_SA, &H_YUY2_SA_DA, &H_W210, &H_W210_DA, &H_W210_SA,
+        &H_W210_SA_DA, &H_RGBQ, &H_RGBQ_DA, &H_RGBQ_SA, &H_RGBQ_SA_DA, &H_ALPHA,
     };
+    if (level != SimdLevel::scalar)
+        for (int i = 0; i < 13; ++i)
+            if (scalar[i] == table) return level == SimdLevel::avx2 ? &H_TABLES_AVX2[i] : &H_TABLES_SSE41[i];
+#else
+    (void)level;
+#endif
+    return table;
 }
-
-}  // namespace
-}  // namespace horizontal
-
-using namespace horizontal;
-
-constexpr HorizontalKernelTable H_YUY2 = make_table<Kernels<DstYuy2, PlainFamily, kNoAlpha>>();
-constexpr HorizontalKernelTable H_YUY2_DA = make_table<Kernels<DstYuy2, DestAlphaFamily, kNoAlpha>>();
-constexpr HorizontalKernelTable H_YUY2_SA = make_table<SourceAlphaKernels<DstYuy2>>();
-constexpr HorizontalKernelTable H_YUY2_SA_DA = make_table<Kernels<DstYuy2, SourceDestAlphaFamily, 2>>();
-constexpr HorizontalKernelTable H_W210 = make_table<Kernels<DstW210, PlainFamily, kNoAlpha>, false>();
-constexpr HorizontalKernelTable H_W210_DA = make_table<Kernels<DstW210, DestAlphaFamily, kNoAlpha>>();
-constexpr HorizontalKernelTable H_W210_SA = make_table<SourceAlphaKernels<DstW210>>();
-constexpr HorizontalKernelTable H_W210_SA_DA = make_table<Kernels<DstW210, SourceDestAlphaFamily, 2>>();
-constexpr HorizontalKernelTable H_RGBQ = make_table<Kernels<DstRgbq, PlainFamily, kNoAlpha>>();
-constexpr HorizontalKernelTable H_RGBQ_DA = make_table<Kernels<DstRgbq, DestAlphaFamily, kNoAlpha>>();
-constexpr HorizontalKernelTable H_RGBQ_SA = make_table<SourceAlphaKernels<DstRgbq>>();
-constexpr HorizontalKernelTable H_RGBQ_SA_DA = make_table<Kernels<DstRgbq, SourceDestAlphaFamily, 2>>();
-constexpr HorizontalKernelTable H_ALPHA =
-    make_table<Kernels<DstAlpha, AlphaOnlyFamily, 2, AlphaOnlyBankFamily>>();
 
 }  // namespace lorvex

@@ -132,6 +132,7 @@ extern "C" LORVEX_API void map_rectangle(const Surface* dest, float x0, float y0
     const SimdLevel simd = simd_level();
     k.vtable = vertical_table_for(k.vtable, simd);
     if (k.alpha_vtable) k.alpha_vtable = vertical_table_for(k.alpha_vtable, simd);
+    k.htable = horizontal_table_for(k.htable, simd);
 
     LineBuffer buffer;  // on the stack, as all state of the call
     // The lead-in before the buffer is read only by the right region of a

@@ -1,0 +1,23 @@
+// The horizontal tables with the SSE41 samplers in the slots they serve.
+#include "horizontal/horizontal_kernels.h"
+#include "horizontal/horizontal_vector.h"
+#include "horizontal/table_builder.h"
+
+namespace lorvex {
+
+extern const HorizontalKernelTable H_TABLES_SSE41[13];
+
+template <class Spec, int T>
+using VectorBank = horizontal::BankSamplerV<Spec, T>;
+
+constexpr HorizontalKernelTable H_TABLES_SSE41[13] = {
+    horizontal::TableSet<VectorBank>::tables[0],  horizontal::TableSet<VectorBank>::tables[1],
+    horizontal::TableSet<VectorBank>::tables[2],  horizontal::TableSet<VectorBank>::tables[3],
+    horizontal::TableSet<VectorBank>::tables[4],  horizontal::TableSet<VectorBank>::tables[5],
+    horizontal::TableSet<VectorBank>::tables[6],  horizontal::TableSet<VectorBank>::tables[7],
+    horizontal::TableSet<VectorBank>::tables[8],  horizontal::TableSet<VectorBank>::tables[9],
+    horizontal::TableSet<VectorBank>::tables[10], horizontal::TableSet<VectorBank>::tables[11],
+    horizontal::TableSet<VectorBank>::tables[12],
+};
+
+}  // namespace lorvex

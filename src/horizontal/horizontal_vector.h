@@ -1,0 +1,136 @@
+// Vector forms of the horizontal samplers, for both vector widths (Vec of
+// shared/vec.h). They compute exactly the sums of their scalar twins in
+// sample_taps.h - the same products, added in 32 bits, with the same rounding
+// - and leave the composition to the family, so the pixels are the same.
+//
+// A bank sampler lays the taps of every phase out once per strip as vectors
+// that match the line buffer's interleaving: luma taps at the even elements
+// of a window of 4:2:2 samples with zeros between, chroma taps on both Cb and
+// Cr elements of a window of pairs, RGBQ taps split over two vectors (first
+// and third samples, second and fourth). A pixel is then a few multiply-adds
+// of whole registers loaded around its position and a horizontal sum. Windows
+// are rounded up to whole registers; the extra elements they load (inside the
+// line buffer's storage) are weighed by zero.
+#pragma once
+
+#include "horizontal/sample_taps.h"
+#include "shared/vec.h"
+
+namespace lorvex::horizontal {
+inline namespace LORVEX_ISA_NAMESPACE {
+
+// The four 32-bit lanes of a 128-bit register, folded from a full register.
+inline __m128i fold128(__m128i v)
+{
+    return v;
+}
+#if defined(LORVEX_ISA_AVX2)
+inline __m128i fold128(__m256i v)
+{
+    return _mm_add_epi32(_mm256_castsi256_si128(v), _mm256_extracti128_si256(v, 1));
+}
+#endif
+
+template <class Spec, int T>
+struct BankSamplerV {
+    using Dst = typename Spec::Dst;
+    using reg = typename Vec::reg;
+    static constexpr int taps = 2 * (T + 1);
+    static constexpr bool is_bank = true;
+    static constexpr int L = Vec::lanes16;
+    // Elements of a window and registers that hold it.
+    static constexpr int kLumaWindow = Dst::pairs ? 2 * taps : 4 * taps;
+    static constexpr int kLumaRegs = (kLumaWindow + L - 1) / L;
+    static constexpr int kChromaWindow = Dst::pairs ? 4 * taps : 0;
+    static constexpr int kChromaRegs = (kChromaWindow + L - 1) / L;
+    static constexpr int kAlphaRegs = (taps + L - 1) / L;
+
+    const int16_t* line;
+    const int16_t* line_a;
+    int32_t pos;
+    int32_t step;
+    // Per phase: luma (or RGBQ first/third) taps, RGBQ second/fourth taps,
+    // chroma taps, alpha taps (contiguous).
+    alignas(32) int16_t cy[16][kLumaRegs * L];
+    alignas(32) int16_t cy2[Dst::pairs ? 1 : 16][kLumaRegs * L];
+    alignas(32) int16_t cc[Dst::pairs ? 16 : 1][kChromaRegs > 0 ? kChromaRegs * L : 1];
+    alignas(32) int16_t ca[Spec::alpha ? 16 : 1][kAlphaRegs * L];
+
+    BankSamplerV(const MapContext& c, const StripRecord& s, bool)
+        : line(c.line), line_a(c.line_a), pos(s.phase), step(c.hstep)
+    {
+        for (int p = 0; p < 16; ++p) {
+            const int16_t* row = c.hbank_y + p * 16;
+            for (int e = 0; e < kLumaRegs * L; ++e) cy[p][e] = 0;
+            if constexpr (Dst::pairs) {
+                for (int k = 0; k < taps; ++k) cy[p][2 * k] = row[7 - T + k];
+                const int16_t* crow = c.hbank_c + p * 16;
+                for (int e = 0; e < kChromaRegs * L; ++e) cc[p][e] = 0;
+                for (int k = 0; k < taps; ++k) cc[p][4 * k + 1] = cc[p][4 * k + 3] = crow[7 - T + k];
+            } else {
+                for (int e = 0; e < kLumaRegs * L; ++e) cy2[p][e] = 0;
+                for (int k = 0; k < taps; ++k) {
+                    cy[p][4 * k] = cy[p][4 * k + 2] = row[7 - T + k];
+                    cy2[p][4 * k + 1] = cy2[p][4 * k + 3] = row[7 - T + k];
+                }
+            }
+            if constexpr (Spec::alpha) {
+                for (int e = 0; e < kAlphaRegs * L; ++e) ca[p][e] = 0;
+                for (int k = 0; k < taps; ++k) ca[p][k] = row[7 - T + k];
+            }
+        }
+    }
+
+    template <int N>
+    static reg dot(const int16_t* window, const int16_t* coef)
+    {
+        reg acc = Vec::madd(Vec::load_i16(window), Vec::load_i16(coef));
+        for (int r = 1; r < N; ++r) acc = Vec::add32(acc, Vec::madd(Vec::load_i16(window + r * L), Vec::load_i16(coef + r * L)));
+        return acc;
+    }
+
+    static int32_t hsum(__m128i v)
+    {
+        v = _mm_add_epi32(v, _mm_shuffle_epi32(v, _MM_SHUFFLE(1, 0, 3, 2)));
+        v = _mm_add_epi32(v, _mm_shuffle_epi32(v, _MM_SHUFFLE(2, 3, 0, 1)));
+        return _mm_cvtsi128_si32(v);
+    }
+
+    void sample(Px& px, bool with_chroma, bool = false) const
+    {
+        constexpr int cs = Spec::colour_shift;
+        const int32_t i = pos >> 16, ph = (pos >> 12) & 15;
+        if constexpr (Dst::pairs) {
+            px.s[0] = mix_bank<cs>(hsum(fold128(dot<kLumaRegs>(line + 2 * (i - T), cy[ph]))));
+            if (with_chroma) {
+                const int32_t j = i >> 1;
+                const int cph = (ph >> 1) + ((i & 1) ? 8 : 0);
+                // Lanes alternate Cb and Cr products.
+                __m128i c = fold128(dot<kChromaRegs>(line + 4 * (j - T), cc[cph]));
+                c = _mm_add_epi32(c, _mm_shuffle_epi32(c, _MM_SHUFFLE(1, 0, 3, 2)));
+                px.s[1] = mix_bank<cs>(_mm_cvtsi128_si32(_mm_srli_si128(c, 0)));
+                px.s[2] = mix_bank<cs>(_mm_cvtsi128_si32(_mm_srli_si128(c, 4)));
+            }
+        } else {
+            // Lanes alternate first and third samples, second and fourth.
+            const int16_t* w = line + 4 * (i - T);
+            __m128i a = fold128(dot<kLumaRegs>(w, cy[ph]));
+            __m128i b = fold128(dot<kLumaRegs>(w, cy2[ph]));
+            a = _mm_add_epi32(a, _mm_shuffle_epi32(a, _MM_SHUFFLE(1, 0, 3, 2)));
+            b = _mm_add_epi32(b, _mm_shuffle_epi32(b, _MM_SHUFFLE(1, 0, 3, 2)));
+            if constexpr (Dst::colour_samples == 4) {
+                px.s[0] = mix_bank<cs>(_mm_cvtsi128_si32(a));
+                px.s[2] = mix_bank<cs>(_mm_cvtsi128_si32(_mm_srli_si128(a, 4)));
+                px.s[1] = mix_bank<cs>(_mm_cvtsi128_si32(b));
+                px.s[3] = mix_bank<cs>(_mm_cvtsi128_si32(_mm_srli_si128(b, 4)));
+            }
+        }
+        if constexpr (Spec::alpha)
+            px.a = mix_bank<Spec::alpha_shift>(hsum(fold128(dot<kAlphaRegs>(line_a + (i - T), ca[ph]))));
+    }
+
+    void advance() { pos += step; }
+};
+
+}  // namespace LORVEX_ISA_NAMESPACE
+}  // namespace lorvex::horizontal
