@@ -38,6 +38,7 @@ inline namespace LORVEX_ISA_NAMESPACE {
 struct DestAlphaFamily {
     static constexpr bool dest_alpha = true;
     static constexpr bool source_alpha = false;
+    static constexpr bool plain = false;  // the plain whole-pixel rule
     static constexpr bool clamps_always = false;
     static constexpr int unclamped_max_taps = 8;
 

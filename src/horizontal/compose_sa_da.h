@@ -44,6 +44,7 @@ inline namespace LORVEX_ISA_NAMESPACE {
 struct SourceDestAlphaFamily {
     static constexpr bool dest_alpha = true;
     static constexpr bool source_alpha = true;
+    static constexpr bool plain = false;  // the plain whole-pixel rule
     static constexpr bool clamps_always = true;
     static constexpr int unclamped_max_taps = 0;
 

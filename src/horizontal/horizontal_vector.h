@@ -130,6 +130,72 @@ struct BankSamplerV {
     }
 
     void advance() { pos += step; }
+
+    // The whole-pixel run of the plain tables: n pairs (4:2:2) or n pixels
+    // (RGBQ), each sample reduced, rounded, limited and mixed in a vector of
+    // four lanes, and stored with the low bits of each result as the scalar
+    // rule stores them.
+    static constexpr bool has_plain_run = !Spec::alpha && !Dst::alpha_only;
+
+    static __m128i reduce_pair(__m128i y0, __m128i y1, __m128i c)
+    {
+        // [Y0 partial sums] [Y1 partial sums] [Cb Cr Cb Cr] -> [Y0 Y1 Cb Cr]
+        const __m128i t = _mm_hadd_epi32(y0, y1);
+        return _mm_hadd_epi32(t, _mm_shuffle_epi32(c, _MM_SHUFFLE(3, 1, 2, 0)));
+    }
+
+    void plain_run(const MapContext& c, typename Dst::sample* d, int32_t n, bool clamp)
+    {
+        constexpr int cs = Spec::colour_shift;
+        const __m128i round = _mm_set1_epi32(1 << (13 + cs));
+        const __m128i top = _mm_set1_epi32(Dst::max);
+        const __m128i zero = _mm_setzero_si128();
+        const int32_t L = c.level;
+        const __m128i lv = _mm_set1_epi32(L), inv = _mm_set1_epi32(4096 - L), half = _mm_set1_epi32(2048);
+        // Low byte or low word of each 32-bit lane, in lane order.
+        const __m128i pick = sizeof(typename Dst::sample) == 1
+                                 ? _mm_setr_epi8(0, 4, 8, 12, -1, -1, -1, -1, -1, -1, -1, -1, -1, -1, -1, -1)
+                                 : _mm_setr_epi8(0, 1, 4, 5, 8, 9, 12, 13, -1, -1, -1, -1, -1, -1, -1, -1);
+        for (int32_t k = 0; k < n; ++k) {
+            __m128i v;
+            if constexpr (Dst::pairs) {
+                const int32_t i0 = pos >> 16, ph0 = (pos >> 12) & 15;
+                const int32_t p1 = pos + step, i1 = p1 >> 16, ph1 = (p1 >> 12) & 15;
+                const int32_t j = i0 >> 1, cph = (ph0 >> 1) + ((i0 & 1) ? 8 : 0);
+                const __m128i y0 = fold128(dot<kLumaRegs>(line + 2 * (i0 - T), cy[ph0]));
+                const __m128i y1 = fold128(dot<kLumaRegs>(line + 2 * (i1 - T), cy[ph1]));
+                const __m128i ch = fold128(dot<kChromaRegs>(line + 4 * (j - T), cc[cph]));
+                // [Y0 Y1 Cb Cr] to the order in memory, Y0 Cb Y1 Cr.
+                v = _mm_shuffle_epi32(reduce_pair(y0, y1, ch), _MM_SHUFFLE(3, 1, 2, 0));
+                pos = p1 + step;
+            } else {
+                const int32_t i = pos >> 16, ph = (pos >> 12) & 15;
+                const int16_t* w = line + 4 * (i - T);
+                const __m128i a = fold128(dot<kLumaRegs>(w, cy[ph]));   // first, third
+                const __m128i b = fold128(dot<kLumaRegs>(w, cy2[ph]));  // second, fourth
+                const __m128i a2 = _mm_add_epi32(a, _mm_shuffle_epi32(a, _MM_SHUFFLE(1, 0, 3, 2)));
+                const __m128i b2 = _mm_add_epi32(b, _mm_shuffle_epi32(b, _MM_SHUFFLE(1, 0, 3, 2)));
+                v = _mm_unpacklo_epi32(a2, b2);
+                pos += step;
+            }
+            v = _mm_srai_epi32(_mm_add_epi32(v, round), 14 + cs);
+            if (clamp) v = _mm_min_epi32(_mm_max_epi32(v, zero), top);
+            if (L != 4096) {
+                __m128i D;
+                if constexpr (sizeof(typename Dst::sample) == 1)
+                    D = _mm_cvtepu8_epi32(_mm_cvtsi32_si128(*reinterpret_cast<const int32_t*>(d)));
+                else
+                    D = _mm_cvtepu16_epi32(_mm_loadl_epi64(reinterpret_cast<const __m128i*>(d)));
+                v = _mm_srai_epi32(_mm_add_epi32(_mm_add_epi32(_mm_mullo_epi32(D, inv), _mm_mullo_epi32(v, lv)), half), 12);
+            }
+            const __m128i out = _mm_shuffle_epi8(v, pick);
+            if constexpr (sizeof(typename Dst::sample) == 1)
+                *reinterpret_cast<int32_t*>(d) = _mm_cvtsi128_si32(out);
+            else
+                _mm_storel_epi64(reinterpret_cast<__m128i*>(d), out);
+            d += 4;
+        }
+    }
 };
 
 }  // namespace LORVEX_ISA_NAMESPACE

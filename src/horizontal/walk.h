@@ -67,6 +67,16 @@ using FullShape = std::conditional_t<Dst::pairs, ShapeEven, std::conditional_t<D
 template <class Dst>
 using LumaShape = std::conditional_t<Dst::pairs, ShapeOdd, FullShape<Dst>>;
 
+// Whether a sampler has a vector run of whole pixels for the plain rule.
+template <class Sampler, class Family>
+constexpr bool uses_plain_run()
+{
+    if constexpr (requires { Sampler::has_plain_run; })
+        return Sampler::has_plain_run && Family::plain;
+    else
+        return false;
+}
+
 // Slots 2..11: the walk, with Sampler computing the samples and Family
 // compositing them.
 template <class Dst, class Sampler, class Family, bool RunInPairs>
@@ -95,22 +105,28 @@ void main_kernel_C(const MapContext& c, const StripRecord& s)
             if (rem >= kRunWidth) {
                 const int32_t n = rem >> kRunShift;
                 rem &= (1 << kRunShift) - 1;
-                for (int32_t k = 0; k < n; ++k) {
-                    smp.sample(px, true, true);
-                    smp.advance();
-                    if (clamp_whole) limit<Dst, Even::n>(px);
-                    if constexpr (kRun == 2) {
-                        smp.sample(px2, false, true);
-                        smp.advance();
-                        if (clamp_whole) limit<Dst, Odd::n>(px2);
-                        Family::template whole<Dst, Even>(c, d, dst_alpha<Family>(c, x), px);
-                        Family::template whole<Dst, Odd>(c, dst_pixel<Dst>(c, x + 1), dst_alpha<Family>(c, x + 1),
-                                                         px2);
-                    } else {
-                        Family::template whole<Dst, Even>(c, d, dst_alpha<Family>(c, x), px);
-                    }
-                    x += kRun;
+                if constexpr (uses_plain_run<Sampler, Family>()) {
+                    smp.plain_run(c, d, n, clamp_whole);
+                    x += kRun * n;
                     d = dst_pixel<Dst>(c, x);
+                } else {
+                    for (int32_t k = 0; k < n; ++k) {
+                        smp.sample(px, true, true);
+                        smp.advance();
+                        if (clamp_whole) limit<Dst, Even::n>(px);
+                        if constexpr (kRun == 2) {
+                            smp.sample(px2, false, true);
+                            smp.advance();
+                            if (clamp_whole) limit<Dst, Odd::n>(px2);
+                            Family::template whole<Dst, Even>(c, d, dst_alpha<Family>(c, x), px);
+                            Family::template whole<Dst, Odd>(c, dst_pixel<Dst>(c, x + 1), dst_alpha<Family>(c, x + 1),
+                                                             px2);
+                        } else {
+                            Family::template whole<Dst, Even>(c, d, dst_alpha<Family>(c, x), px);
+                        }
+                        x += kRun;
+                        d = dst_pixel<Dst>(c, x);
+                    }
                 }
             }
             if (rem == 0) return;
