@@ -7,8 +7,8 @@ namespace lorvex {
 
 extern const HorizontalKernelTable H_TABLES_SSE41[13];
 
-template <class Spec, int T>
-using VectorBank = horizontal::BankSamplerV<Spec, T>;
+template <class Units, int T>
+using VectorBank = horizontal::BankSamplerV<Units, T>;
 
 constexpr HorizontalKernelTable H_TABLES_SSE41[13] = {
     horizontal::TableSet<VectorBank>::tables[0],  horizontal::TableSet<VectorBank>::tables[1],

@@ -31,9 +31,9 @@ inline __m128i fold128(__m256i v)
 }
 #endif
 
-template <class Spec, int T>
+template <class Units, int T>
 struct BankSamplerV {
-    using Dst = typename Spec::Dst;
+    using Dst = typename Units::Dst;
     using reg = typename Vec::reg;
     static constexpr int taps = 2 * (T + 1);
     static constexpr bool is_bank = true;
@@ -54,7 +54,7 @@ struct BankSamplerV {
     alignas(32) int16_t cy[16][kLumaRegs * L];
     alignas(32) int16_t cy2[Dst::pairs ? 1 : 16][kLumaRegs * L];
     alignas(32) int16_t cc[Dst::pairs ? 16 : 1][kChromaRegs > 0 ? kChromaRegs * L : 1];
-    alignas(32) int16_t ca[Spec::alpha ? 16 : 1][kAlphaRegs * L];
+    alignas(32) int16_t ca[Units::alpha ? 16 : 1][kAlphaRegs * L];
 
     BankSamplerV(const MapContext& c, const StripRecord& s, bool)
         : line(c.line), line_a(c.line_a), pos(s.phase), step(c.hstep)
@@ -74,7 +74,7 @@ struct BankSamplerV {
                     cy2[p][4 * k + 1] = cy2[p][4 * k + 3] = row[7 - T + k];
                 }
             }
-            if constexpr (Spec::alpha) {
+            if constexpr (Units::alpha) {
                 for (int e = 0; e < kAlphaRegs * L; ++e) ca[p][e] = 0;
                 for (int k = 0; k < taps; ++k) ca[p][k] = row[7 - T + k];
             }
@@ -98,7 +98,7 @@ struct BankSamplerV {
 
     void sample(Px& px, bool with_chroma, bool = false) const
     {
-        constexpr int cs = Spec::colour_shift;
+        constexpr int cs = Units::colour_shift;
         const int32_t i = pos >> 16, ph = (pos >> 12) & 15;
         if constexpr (Dst::pairs) {
             px.s[0] = mix_bank<cs>(hsum(fold128(dot<kLumaRegs>(line + 2 * (i - T), cy[ph]))));
@@ -125,8 +125,8 @@ struct BankSamplerV {
                 px.s[3] = mix_bank<cs>(_mm_cvtsi128_si32(_mm_srli_si128(b, 4)));
             }
         }
-        if constexpr (Spec::alpha)
-            px.a = mix_bank<Spec::alpha_shift>(hsum(fold128(dot<kAlphaRegs>(line_a + (i - T), ca[ph]))));
+        if constexpr (Units::alpha)
+            px.a = mix_bank<Units::alpha_shift>(hsum(fold128(dot<kAlphaRegs>(line_a + (i - T), ca[ph]))));
     }
 
     void advance() { pos += step; }
@@ -135,7 +135,7 @@ struct BankSamplerV {
     // (RGBQ), each sample reduced, rounded, limited and mixed in a vector of
     // four lanes, and stored with the low bits of each result as the scalar
     // rule stores them.
-    static constexpr bool has_plain_run = !Spec::alpha && !Dst::alpha_only;
+    static constexpr bool has_plain_run = !Units::alpha && !Dst::alpha_only;
 
     static __m128i reduce_pair(__m128i y0, __m128i y1, __m128i c)
     {
@@ -146,7 +146,7 @@ struct BankSamplerV {
 
     void plain_run(const MapContext& c, typename Dst::sample* d, int32_t n, bool clamp)
     {
-        constexpr int cs = Spec::colour_shift;
+        constexpr int cs = Units::colour_shift;
         const __m128i round = _mm_set1_epi32(1 << (13 + cs));
         const __m128i top = _mm_set1_epi32(Dst::max);
         const __m128i zero = _mm_setzero_si128();

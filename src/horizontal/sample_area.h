@@ -26,15 +26,15 @@
 #include "shared/isa.h"
 
 #include "horizontal/pixel.h"
-#include "horizontal/sample_spec.h"
+#include "horizontal/sample_units.h"
 #include "shared/map_context.h"
 
 namespace lorvex::horizontal {
 inline namespace LORVEX_ISA_NAMESPACE {
 
-template <class Spec>
+template <class Units>
 struct AreaSampler {
-    using Dst = typename Spec::Dst;
+    using Dst = typename Units::Dst;
     static constexpr int taps = 0;
     static constexpr bool is_bank = false;
 
@@ -118,14 +118,14 @@ struct AreaSampler {
     {
         constexpr int N = Dst::colour_samples;
         constexpr int E = Dst::pairs ? 2 : 4;
-        constexpr int cs = Spec::colour_shift;
-        constexpr int M = N + (Spec::alpha ? 1 : 0);
+        constexpr int cs = Units::colour_shift;
+        constexpr int M = N + (Units::alpha ? 1 : 0);
         Comp c[M];
         for (int e = 0; e < N; ++e) c[e] = {line + e, E, int64_t(1) << (15 + cs), 0};
-        if constexpr (Spec::alpha) c[N] = {line_a, 1, int64_t(1) << (15 + Spec::alpha_shift), 0};
-        walk<M>(c, p, r, w, 0x10000, whole, Spec::truncated_pair_luma ? N : 0);
+        if constexpr (Units::alpha) c[N] = {line_a, 1, int64_t(1) << (15 + Units::alpha_shift), 0};
+        walk<M>(c, p, r, w, 0x10000, whole, Units::truncated_pair_luma ? N : 0);
         for (int e = 0; e < N; ++e) px.s[e] = int32_t(c[e].acc >> (16 + cs));
-        if constexpr (Spec::alpha) px.a = int32_t(c[N].acc >> (16 + Spec::alpha_shift));
+        if constexpr (Units::alpha) px.a = int32_t(c[N].acc >> (16 + Units::alpha_shift));
 
         if constexpr (Dst::pairs) {
             if (!with_chroma) return;

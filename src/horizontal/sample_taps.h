@@ -17,7 +17,7 @@
 // the table has it, is read from `line_a` at pixel i by the luma rule with the
 // luma coefficients.
 //
-// Results carry one rounding, in the units of the spec (sample_spec.h).
+// Results carry one rounding, in the units of sample_units.h.
 // Reach: luma pixels i - T .. i + T + 1, chroma pairs j - T .. j + T + 1; the
 // strip plan leaves that margin.
 #pragma once
@@ -25,15 +25,15 @@
 #include "shared/isa.h"
 
 #include "horizontal/pixel.h"
-#include "horizontal/sample_spec.h"
+#include "horizontal/sample_units.h"
 #include "shared/map_context.h"
 
 namespace lorvex::horizontal {
 inline namespace LORVEX_ISA_NAMESPACE {
 
-template <class Spec>
+template <class Units>
 struct LinearSampler {
-    using Dst = typename Spec::Dst;
+    using Dst = typename Units::Dst;
     static constexpr int taps = 2;
     static constexpr bool is_bank = false;
 
@@ -47,7 +47,7 @@ struct LinearSampler {
 
     static int32_t lerp(const int16_t* v, int32_t spacing, int32_t f)
     {
-        return mix_w16<Spec::colour_shift>(int64_t(v[0]) * (0x10000 - f) + int64_t(v[spacing]) * f);
+        return mix_w16<Units::colour_shift>(int64_t(v[0]) * (0x10000 - f) + int64_t(v[spacing]) * f);
     }
 
     void sample(Px& px, bool with_chroma, bool = false) const
@@ -61,22 +61,22 @@ struct LinearSampler {
                 const int32_t w1 = (i & 1) ? 0x10000 + f : f;
                 for (int c = 0; c < 2; ++c) {
                     const int16_t* cs = line + 4 * j + 1 + 2 * c;
-                    px.s[1 + c] = mix_w17<Spec::colour_shift>(int64_t(cs[0]) * w0 + int64_t(cs[4]) * w1);
+                    px.s[1 + c] = mix_w17<Units::colour_shift>(int64_t(cs[0]) * w0 + int64_t(cs[4]) * w1);
                 }
             }
         } else {
             for (int e = 0; e < Dst::colour_samples; ++e) px.s[e] = lerp(line + 4 * i + e, 4, f);
         }
-        if constexpr (Spec::alpha)
-            px.a = mix_w16<Spec::alpha_shift>(int64_t(line_a[i]) * (0x10000 - f) + int64_t(line_a[i + 1]) * f);
+        if constexpr (Units::alpha)
+            px.a = mix_w16<Units::alpha_shift>(int64_t(line_a[i]) * (0x10000 - f) + int64_t(line_a[i + 1]) * f);
     }
 
     void advance() { pos += step; }
 };
 
-template <class Spec, int T>
+template <class Units, int T>
 struct BankSampler {
-    using Dst = typename Spec::Dst;
+    using Dst = typename Units::Dst;
     static constexpr int taps = 2 * (T + 1);
     static constexpr bool is_bank = true;
 
@@ -100,7 +100,7 @@ struct BankSampler {
 
     void sample(Px& px, bool with_chroma, bool = false) const
     {
-        constexpr int cs = Spec::colour_shift;
+        constexpr int cs = Units::colour_shift;
         const int32_t i = pos >> 16, ph = (pos >> 12) & 15;
         const int16_t* row = bank_y + ph * 16;
         if constexpr (Dst::pairs) {
@@ -114,7 +114,7 @@ struct BankSampler {
         } else {
             for (int e = 0; e < Dst::colour_samples; ++e) px.s[e] = mix_bank<cs>(taps_sum(row, line + 4 * i + e, 4));
         }
-        if constexpr (Spec::alpha) px.a = mix_bank<Spec::alpha_shift>(taps_sum(row, line_a + i, 1));
+        if constexpr (Units::alpha) px.a = mix_bank<Units::alpha_shift>(taps_sum(row, line_a + i, 1));
     }
 
     void advance() { pos += step; }

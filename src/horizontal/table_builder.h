@@ -16,24 +16,24 @@
 namespace lorvex::horizontal {
 inline namespace LORVEX_ISA_NAMESPACE {
 
-template <class Spec, int T>
-using ScalarBank = BankSampler<Spec, T>;
+template <class Units, int T>
+using ScalarBank = BankSampler<Units, T>;
 
 // The kernels of one table. Samples in stored depth; alpha in the unit the
 // family reads (AlphaShift: 0 for 1/16384, 2 for 1/4096, kNoAlpha).
 template <class Dst, class Family, int AlphaShift, class BankFamily = Family,
           template <class, int> class Bank = ScalarBank>
 struct Kernels {
-    using Spec = StoredSpec<Dst, AlphaShift>;
+    using Units = StoredSpec<Dst, AlphaShift>;
     // The area walk of RGBQ runs in steps of two pixels, like the pairs.
     static constexpr bool kAreaPairs = !Dst::alpha_only;
 
     static constexpr Kernel left = region_C<Dst, Family, false>;
     static constexpr Kernel right = region_C<Dst, Family, true>;
-    static constexpr Kernel area = main_kernel_C<Dst, AreaSampler<Spec>, Family, kAreaPairs>;
-    static constexpr Kernel linear = main_kernel_C<Dst, LinearSampler<Spec>, Family, Dst::pairs>;
+    static constexpr Kernel area = main_kernel_C<Dst, AreaSampler<Units>, Family, kAreaPairs>;
+    static constexpr Kernel linear = main_kernel_C<Dst, LinearSampler<Units>, Family, Dst::pairs>;
     template <int T>
-    static constexpr Kernel bank = main_kernel_C<Dst, Bank<Spec, T>, BankFamily, Dst::pairs>;
+    static constexpr Kernel bank = main_kernel_C<Dst, Bank<Units, T>, BankFamily, Dst::pairs>;
 };
 
 // The source-alpha tables: slots 2 to 5 choose per call between the fast form
@@ -41,17 +41,17 @@ struct Kernels {
 template <class Dst, template <class, int> class Bank = ScalarBank>
 struct SourceAlphaKernels : Kernels<Dst, SourceAlphaFamily, 0, SourceAlphaFamily, Bank> {
     using Base = Kernels<Dst, SourceAlphaFamily, 0, SourceAlphaFamily, Bank>;
-    using Spec = typename Base::Spec;
+    using Units = typename Base::Units;
     using FastArea = SampleSpec<Dst, 0, 0, true>;
     using Fast = SampleSpec<Dst, 0, 0>;
 
-    static constexpr Kernel area = fast_or_general_C<Dst, AreaSampler<Spec>, AreaSampler<FastArea>,
+    static constexpr Kernel area = fast_or_general_C<Dst, AreaSampler<Units>, AreaSampler<FastArea>,
                                                      SourceAlphaFamily, SourceAlphaFastFamily, true>;
-    static constexpr Kernel linear = fast_or_general_C<Dst, LinearSampler<Spec>, LinearSampler<Fast>,
+    static constexpr Kernel linear = fast_or_general_C<Dst, LinearSampler<Units>, LinearSampler<Fast>,
                                                        SourceAlphaFamily, SourceAlphaFastFamily, Dst::pairs>;
     template <int T>
     static constexpr Kernel bank =
-        T <= 1 ? fast_or_general_C<Dst, Bank<Spec, T>, Bank<Fast, T>, SourceAlphaFamily, SourceAlphaFastFamily,
+        T <= 1 ? fast_or_general_C<Dst, Bank<Units, T>, Bank<Fast, T>, SourceAlphaFamily, SourceAlphaFastFamily,
                                    Dst::pairs>
                : Base::template bank<T>;
 };
