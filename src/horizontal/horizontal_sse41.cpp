@@ -9,15 +9,18 @@ extern const HorizontalKernelTable H_TABLES_SSE41[13];
 
 template <class Units, int T>
 using VectorBank = horizontal::BankSamplerV<Units, T>;
+template <class Units>
+using VectorArea = horizontal::AreaSamplerV<Units>;
+using Vector = horizontal::TableSet<VectorBank, VectorArea>;
 
 constexpr HorizontalKernelTable H_TABLES_SSE41[13] = {
-    horizontal::TableSet<VectorBank>::tables[0],  horizontal::TableSet<VectorBank>::tables[1],
-    horizontal::TableSet<VectorBank>::tables[2],  horizontal::TableSet<VectorBank>::tables[3],
-    horizontal::TableSet<VectorBank>::tables[4],  horizontal::TableSet<VectorBank>::tables[5],
-    horizontal::TableSet<VectorBank>::tables[6],  horizontal::TableSet<VectorBank>::tables[7],
-    horizontal::TableSet<VectorBank>::tables[8],  horizontal::TableSet<VectorBank>::tables[9],
-    horizontal::TableSet<VectorBank>::tables[10], horizontal::TableSet<VectorBank>::tables[11],
-    horizontal::TableSet<VectorBank>::tables[12],
+    Vector::tables[0],  Vector::tables[1],
+    Vector::tables[2],  Vector::tables[3],
+    Vector::tables[4],  Vector::tables[5],
+    Vector::tables[6],  Vector::tables[7],
+    Vector::tables[8],  Vector::tables[9],
+    Vector::tables[10], Vector::tables[11],
+    Vector::tables[12],
 };
 
 }  // namespace lorvex

@@ -13,6 +13,8 @@
 // line buffer's storage) are weighed by zero.
 #pragma once
 
+#include "horizontal/compose_plain.h"
+#include "horizontal/sample_area.h"
 #include "horizontal/sample_taps.h"
 #include "shared/vec.h"
 
@@ -194,6 +196,91 @@ struct BankSamplerV {
             else
                 _mm_storel_epi64(reinterpret_cast<__m128i*>(d), out);
             d += 4;
+        }
+    }
+};
+
+// The area sampler with a vector run for the plain tables at full level, where
+// the buffer samples and the destination pixels line up one to one (a step of
+// exactly one pixel, the walk at the start of a sample, and in 4:2:2 the
+// chroma walk at the start of the pair): each destination sample is then its
+// buffer element rounded to stored depth, (x + 16) >> 5 or (x + 4) >> 3, and
+// a run is a straight conversion of consecutive elements. Any other run takes
+// the scalar walk.
+template <class Units>
+struct AreaSamplerV : AreaSampler<Units> {
+    using Base = AreaSampler<Units>;
+    using Dst = typename Units::Dst;
+    using Base::Base;
+    static constexpr bool has_plain_run = !Units::alpha && !Dst::alpha_only;
+
+    bool aligned() const
+    {
+        if (this->w != 0x10000 || this->r != 0x10000) return false;
+        if constexpr (Dst::pairs) return this->r2 == 0x20000 && 2 * this->p2 == this->p;
+        return true;
+    }
+
+    // n whole pairs (4:2:2) or pairs of pixels (RGBQ): the area walk's run.
+    void plain_run(const MapContext& c, typename Dst::sample* d, int32_t n, bool clamp)
+    {
+        using T = typename Dst::sample;
+        constexpr int E = Dst::pairs ? 2 : 4;
+        if (c.level == 4096 && aligned()) {
+            const int32_t count = 2 * E * n;  // elements of n pairs of pixels
+            const int16_t* in = this->line + E * this->p;
+            const __m128i half = _mm_set1_epi16(int16_t(1 << (Dst::buffer_shift - 1)));
+            int32_t e = 0;
+            for (; e + 8 <= count; e += 8) {
+                const __m128i v = _mm_srai_epi16(_mm_adds_epi16(_mm_loadu_si128((const __m128i*)(in + e)), half),
+                                                 Dst::buffer_shift);
+                if (!exact_add(in + e)) break;
+                if constexpr (sizeof(T) == 1) {
+                    const __m128i b = clamp ? _mm_packus_epi16(v, v)
+                                            : _mm_packus_epi16(_mm_and_si128(v, _mm_set1_epi16(0xFF)), v);
+                    _mm_storel_epi64((__m128i*)(d + e), b);
+                } else {
+                    const __m128i w = clamp ? _mm_min_epi16(_mm_max_epi16(v, _mm_setzero_si128()),
+                                                            _mm_set1_epi16(int16_t(Dst::max)))
+                                            : v;
+                    _mm_storeu_si128((__m128i*)(d + e), w);
+                }
+            }
+            for (; e < count; ++e) {
+                const int32_t v = mix1<Dst::buffer_shift>(in[e]);
+                d[e] = T(clamp ? clamp_to(v, 0, Dst::max) : v);
+            }
+            this->p += 2 * n;
+            if constexpr (Dst::pairs) this->p2 += n;
+            return;
+        }
+        generic_run(c, d, n, clamp);
+    }
+
+    // The saturating add above is exact unless an element is within the
+    // rounding term of the i16 limit.
+    static bool exact_add(const int16_t* in)
+    {
+        const __m128i v = _mm_loadu_si128((const __m128i*)in);
+        return _mm_movemask_epi8(_mm_cmpgt_epi16(v, _mm_set1_epi16(int16_t(32767 - 16)))) == 0;
+    }
+
+    void generic_run(const MapContext& c, typename Dst::sample* d, int32_t n, bool clamp)
+    {
+        using Even = std::conditional_t<Dst::pairs, ShapeEven, ShapeQuad>;
+        using Odd = std::conditional_t<Dst::pairs, ShapeOdd, ShapeQuad>;
+        constexpr int step = Dst::bytes_per_pixel / sizeof(typename Dst::sample);
+        Px px{}, px2{};
+        for (int32_t k = 0; k < n; ++k) {
+            this->sample(px, true, true);
+            this->sample(px2, false, true);
+            if (clamp) {
+                for (int i = 0; i < 4; ++i) px.s[i] = clamp_to(px.s[i], 0, Dst::max);
+                for (int i = 0; i < 4; ++i) px2.s[i] = clamp_to(px2.s[i], 0, Dst::max);
+            }
+            PlainFamily::whole<Dst, Even>(c, d, nullptr, px);
+            PlainFamily::whole<Dst, Odd>(c, d + step, nullptr, px2);
+            d += 2 * step;
         }
     }
 };

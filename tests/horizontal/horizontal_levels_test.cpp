@@ -1,6 +1,6 @@
 // The vector horizontal kernels give the same bytes as the scalar kernels:
 // for every table, every vector level this processor has and every main
-// slot, random strips (widths from one pixel to many, both parities of the
+// slot (area, linear, bank), random strips (widths from one pixel to many, both parities of the
 // first pixel, partial and whole coverage, clamp on and off, level 4096 and
 // others, tile and overlay, both destination associations) over random line
 // buffers and destinations.
@@ -65,8 +65,8 @@ TEST(HorizontalLevels, VectorKernelsMatchScalarOnRandomStrips)
     int compared = 0;
     for (const Table& t : kTables) {
         for (int iter = 0; iter < 60; ++iter) {
-            const int slot = 4 + int(rng() % 8);
-            const int T = slot - 4;
+            const int slot = 2 + int(rng() % 10);
+            const int T = slot >= 4 ? slot - 4 : 1;
             LineBuffer buffer;
             for (int16_t& v : buffer.storage) v = int16_t(int(rng() % 9000) - 400);
             MapContext c;
@@ -94,6 +94,14 @@ TEST(HorizontalLevels, VectorKernelsMatchScalarOnRandomStrips)
             if (s.width16 <= 0) s.width16 = 0x10000 - frac;
             s.first_cover = std::min(0x10000 - frac, s.width16);
             s.phase = ((8 + T) << 16) + int32_t(rng() % 0x10000);
+            if (slot == 2) {
+                // The area walk: sometimes exactly one sample per pixel from
+                // the start of a sample, sometimes any reduction.
+                const bool aligned = rng() % 2;
+                c.hstep = aligned ? 0x10000 : 128 + int32_t(rng() % 0x30000);
+                s.phase = aligned ? int32_t(rng() % 8) * 0x20000 : int32_t(rng() % 0x80000);
+                if (aligned) c.vcover = 16384;
+            }
 
             const size_t dst_bytes = size_t(s.x + pixels + 4) * t.bytes_per_pixel;
             std::vector<uint8_t> d0(dst_bytes + 64), a0((s.x + pixels + 4) * 2 + 64);
