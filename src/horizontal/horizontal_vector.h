@@ -265,22 +265,93 @@ struct AreaSamplerV : AreaSampler<Units> {
         return _mm_movemask_epi8(_mm_cmpgt_epi16(v, _mm_set1_epi16(int16_t(32767 - 16)))) == 0;
     }
 
+    // Consumes `span` of width from the walk (p, r) over components of N
+    // samples at base[p E + e C]: whole samples while they end inside the
+    // span, then the part of the next one. The same steps as the walk of
+    // sample_area.h, without its shortcuts.
+    template <int N, int E, int C>
+    static void consume(const int16_t* base, int32_t& p, int32_t& r, int32_t w, int32_t span, int64_t acc[N])
+    {
+        while (r < span) {
+            for (int e = 0; e < N; ++e) acc[e] += int64_t(base[p * E + e * C]) * r;
+            span -= r;
+            ++p;
+            r = w;
+        }
+        for (int e = 0; e < N; ++e) acc[e] += int64_t(base[p * E + e * C]) * span;
+        r -= span;
+        if (r == 0) {
+            ++p;
+            r = w;
+        }
+    }
+
+    // The four samples of an RGBQ pixel walked together in 64-bit lanes (a
+    // sample times a width needs 32 bits, their sum more): the same sums as
+    // consume<4, 4, 1>, shifted right by `shift` to 32-bit results.
+    static void consume_quad(const int16_t* line, int32_t& p, int32_t& r, int32_t w, int64_t bias, int shift,
+                             int32_t out[4])
+    {
+        __m128i lo = _mm_set1_epi64x(bias), hi = lo;  // samples 0, 1 and 2, 3
+        const auto add = [&](int32_t at, int32_t n) {
+            const __m128i s = _mm_loadl_epi64(reinterpret_cast<const __m128i*>(line + 4 * at));
+            const __m128i nv = _mm_set1_epi64x(n);
+            lo = _mm_add_epi64(lo, _mm_mul_epi32(_mm_cvtepi16_epi64(s), nv));
+            hi = _mm_add_epi64(hi, _mm_mul_epi32(_mm_cvtepi16_epi64(_mm_srli_si128(s, 4)), nv));
+        };
+        int32_t span = 0x10000;
+        while (r < span) {
+            add(p, r);
+            span -= r;
+            ++p;
+            r = w;
+        }
+        add(p, span);
+        r -= span;
+        if (r == 0) {
+            ++p;
+            r = w;
+        }
+        // The results fit 32 bits: the low half of a logical shift is the
+        // arithmetic one's.
+        const __m128i sl = _mm_srl_epi64(lo, _mm_cvtsi32_si128(shift));
+        const __m128i sh = _mm_srl_epi64(hi, _mm_cvtsi32_si128(shift));
+        out[0] = _mm_cvtsi128_si32(sl);
+        out[1] = _mm_extract_epi32(sl, 2);
+        out[2] = _mm_cvtsi128_si32(sh);
+        out[3] = _mm_extract_epi32(sh, 2);
+    }
+
     void generic_run(const MapContext& c, typename Dst::sample* d, int32_t n, bool clamp)
     {
-        using Even = std::conditional_t<Dst::pairs, ShapeEven, ShapeQuad>;
-        using Odd = std::conditional_t<Dst::pairs, ShapeOdd, ShapeQuad>;
-        constexpr int step = Dst::bytes_per_pixel / sizeof(typename Dst::sample);
-        Px px{}, px2{};
+        using T = typename Dst::sample;
+        constexpr int cs = Units::colour_shift;
+        constexpr int64_t b16 = int64_t(1) << (15 + cs), b17 = int64_t(1) << (16 + cs);
+        const int32_t L = c.level;
+        const auto put = [&](T* at, int64_t acc, int shift) {
+            int32_t v = int32_t(acc >> shift);
+            if (clamp) v = clamp_to(v, 0, Dst::max);
+            *at = T(L == 4096 ? v : (int32_t(*at) * (4096 - L) + v * L + 2048) >> 12);
+        };
+        const int32_t w = this->w;
         for (int32_t k = 0; k < n; ++k) {
-            this->sample(px, true, true);
-            this->sample(px2, false, true);
-            if (clamp) {
-                for (int i = 0; i < 4; ++i) px.s[i] = clamp_to(px.s[i], 0, Dst::max);
-                for (int i = 0; i < 4; ++i) px2.s[i] = clamp_to(px2.s[i], 0, Dst::max);
+            if constexpr (Dst::pairs) {
+                int64_t y0[1] = {b16}, y1[1] = {b16}, ch[2] = {b17, b17};
+                consume<1, 2, 1>(this->line, this->p, this->r, w, 0x10000, y0);
+                consume<2, 4, 2>(this->line + 1, this->p2, this->r2, 2 * w, 0x20000, ch);
+                consume<1, 2, 1>(this->line, this->p, this->r, w, 0x10000, y1);
+                put(d, y0[0], 16 + cs);
+                put(d + 1, ch[0], 17 + cs);
+                put(d + 2, y1[0], 16 + cs);
+                put(d + 3, ch[1], 17 + cs);
+            } else {
+                for (int half = 0; half < 2; ++half) {
+                    int32_t v[4];
+                    consume_quad(this->line, this->p, this->r, w, b16, 16 + cs, v);
+                    for (int e = 0; e < 4; ++e) put(d + 4 * half + e, int64_t(v[e]) << (16 + cs), 16 + cs);
+                }
             }
-            PlainFamily::whole<Dst, Even>(c, d, nullptr, px);
-            PlainFamily::whole<Dst, Odd>(c, d + step, nullptr, px2);
-            d += 2 * step;
+            d += Dst::pairs ? 2 * Dst::bytes_per_pixel / sizeof(T) : 8;
         }
     }
 };
