@@ -11,7 +11,9 @@ template <class Units, int T>
 using VectorBank = horizontal::BankSamplerV<Units, T>;
 template <class Units>
 using VectorArea = horizontal::AreaSamplerV<Units>;
-using Vector = horizontal::TableSet<VectorBank, VectorArea>;
+template <class Units>
+using VectorLinear = horizontal::LinearSamplerV<Units>;
+using Vector = horizontal::TableSet<VectorBank, VectorArea, VectorLinear>;
 
 constexpr HorizontalKernelTable H_TABLES_SSE41[13] = {
     Vector::tables[0],  Vector::tables[1],

@@ -356,5 +356,52 @@ struct AreaSamplerV : AreaSampler<Units> {
     }
 };
 
+// The linear sampler with a vector run for the plain RGBQ tables: the four
+// samples of a pixel interpolated in 64-bit lanes (a sample times a 16-bit
+// fraction and the sum of two such need more than 32 bits), with the
+// rounding of the scalar rule.
+template <class Units>
+struct LinearSamplerV : LinearSampler<Units> {
+    using Base = LinearSampler<Units>;
+    using Dst = typename Units::Dst;
+    using Base::Base;
+    static constexpr bool has_plain_run = !Units::alpha && !Dst::alpha_only && !Dst::pairs;
+
+    void plain_run(const MapContext& c, typename Dst::sample* d, int32_t n, bool clamp)
+    {
+        using T = typename Dst::sample;
+        constexpr int cs = Units::colour_shift;
+        const __m128i bias = _mm_set1_epi64x(int64_t(1) << (15 + cs));
+        const __m128i shift = _mm_cvtsi32_si128(16 + cs);
+        const __m128i top = _mm_set1_epi32(Dst::max), zero = _mm_setzero_si128();
+        const int32_t L = c.level;
+        const __m128i lv = _mm_set1_epi32(L), inv = _mm_set1_epi32(4096 - L), half = _mm_set1_epi32(2048);
+        for (int32_t k = 0; k < n; ++k, d += 4) {
+            const int32_t i = this->pos >> 16, f = this->pos & 0xFFFF;
+            this->pos += this->step;
+            const __m128i a = _mm_loadl_epi64(reinterpret_cast<const __m128i*>(this->line + 4 * i));
+            const __m128i b = _mm_loadl_epi64(reinterpret_cast<const __m128i*>(this->line + 4 * i + 4));
+            const __m128i wa = _mm_set1_epi64x(0x10000 - f), wb = _mm_set1_epi64x(f);
+            const auto lerp = [&](__m128i x, __m128i y) {
+                const __m128i s = _mm_add_epi64(_mm_add_epi64(_mm_mul_epi32(_mm_cvtepi16_epi64(x), wa),
+                                                              _mm_mul_epi32(_mm_cvtepi16_epi64(y), wb)),
+                                                bias);
+                return _mm_srl_epi64(s, shift);  // low halves are the arithmetic shift's
+            };
+            const __m128i lo = lerp(a, b), hi = lerp(_mm_srli_si128(a, 4), _mm_srli_si128(b, 4));
+            __m128i v = _mm_castps_si128(
+                _mm_shuffle_ps(_mm_castsi128_ps(lo), _mm_castsi128_ps(hi), _MM_SHUFFLE(2, 0, 2, 0)));
+            if (clamp) v = _mm_min_epi32(_mm_max_epi32(v, zero), top);
+            if (L != 4096) {
+                const __m128i D = _mm_cvtepu8_epi32(_mm_cvtsi32_si128(*reinterpret_cast<const int32_t*>(d)));
+                v = _mm_srai_epi32(_mm_add_epi32(_mm_add_epi32(_mm_mullo_epi32(D, inv), _mm_mullo_epi32(v, lv)), half), 12);
+            }
+            const __m128i out = _mm_shuffle_epi8(v, _mm_setr_epi8(0, 4, 8, 12, -1, -1, -1, -1, -1, -1, -1, -1, -1, -1, -1, -1));
+            static_assert(sizeof(T) == 1);
+            *reinterpret_cast<int32_t*>(d) = _mm_cvtsi128_si32(out);
+        }
+    }
+};
+
 }  // namespace LORVEX_ISA_NAMESPACE
 }  // namespace lorvex::horizontal

@@ -20,11 +20,14 @@ template <class Units, int T>
 using ScalarBank = BankSampler<Units, T>;
 template <class Units>
 using ScalarArea = AreaSampler<Units>;
+template <class Units>
+using ScalarLinear = LinearSampler<Units>;
 
 // The kernels of one table. Samples in stored depth; alpha in the unit the
 // family reads (AlphaShift: 0 for 1/16384, 2 for 1/4096, kNoAlpha).
 template <class Dst, class Family, int AlphaShift, class BankFamily = Family,
-          template <class, int> class Bank = ScalarBank, template <class> class Area = ScalarArea>
+          template <class, int> class Bank = ScalarBank, template <class> class Area = ScalarArea,
+          template <class> class Linear = ScalarLinear>
 struct Kernels {
     using Units = StoredSpec<Dst, AlphaShift>;
     // The area walk of RGBQ runs in steps of two pixels, like the pairs.
@@ -33,7 +36,7 @@ struct Kernels {
     static constexpr Kernel left = region_C<Dst, Family, false>;
     static constexpr Kernel right = region_C<Dst, Family, true>;
     static constexpr Kernel area = main_kernel_C<Dst, Area<Units>, Family, kAreaPairs>;
-    static constexpr Kernel linear = main_kernel_C<Dst, LinearSampler<Units>, Family, Dst::pairs>;
+    static constexpr Kernel linear = main_kernel_C<Dst, Linear<Units>, Family, Dst::pairs>;
     template <int T>
     static constexpr Kernel bank = main_kernel_C<Dst, Bank<Units, T>, BankFamily, Dst::pairs>;
 };
@@ -71,18 +74,19 @@ constexpr HorizontalKernelTable make_table()
 }
 
 // The thirteen tables of one instruction set, in their order of storage.
-template <template <class, int> class Bank, template <class> class Area = ScalarArea>
+template <template <class, int> class Bank, template <class> class Area = ScalarArea,
+          template <class> class Linear = ScalarLinear>
 struct TableSet {
     static constexpr HorizontalKernelTable tables[13] = {
-        make_table<Kernels<DstYuy2, PlainFamily, kNoAlpha, PlainFamily, Bank, Area>>(),
+        make_table<Kernels<DstYuy2, PlainFamily, kNoAlpha, PlainFamily, Bank, Area, Linear>>(),
         make_table<Kernels<DstYuy2, DestAlphaFamily, kNoAlpha, DestAlphaFamily, Bank>>(),
         make_table<SourceAlphaKernels<DstYuy2, Bank>>(),
         make_table<Kernels<DstYuy2, SourceDestAlphaFamily, 2, SourceDestAlphaFamily, Bank>>(),
-        make_table<Kernels<DstW210, PlainFamily, kNoAlpha, PlainFamily, Bank, Area>, false>(),
+        make_table<Kernels<DstW210, PlainFamily, kNoAlpha, PlainFamily, Bank, Area, Linear>, false>(),
         make_table<Kernels<DstW210, DestAlphaFamily, kNoAlpha, DestAlphaFamily, Bank>>(),
         make_table<SourceAlphaKernels<DstW210, Bank>>(),
         make_table<Kernels<DstW210, SourceDestAlphaFamily, 2, SourceDestAlphaFamily, Bank>>(),
-        make_table<Kernels<DstRgbq, PlainFamily, kNoAlpha, PlainFamily, Bank, Area>>(),
+        make_table<Kernels<DstRgbq, PlainFamily, kNoAlpha, PlainFamily, Bank, Area, Linear>>(),
         make_table<Kernels<DstRgbq, DestAlphaFamily, kNoAlpha, DestAlphaFamily, Bank>>(),
         make_table<SourceAlphaKernels<DstRgbq, Bank>>(),
         make_table<Kernels<DstRgbq, SourceDestAlphaFamily, 2, SourceDestAlphaFamily, Bank>>(),
