@@ -26,6 +26,7 @@ struct AlphaOnlyFamilyT {
     static constexpr bool dest_alpha = false;  // the image itself is the plane
     static constexpr bool source_alpha = true;
     static constexpr bool plain = false;  // the plain whole-pixel rule
+    static constexpr bool fast_alpha = false;  // the fast source-alpha rule
     static constexpr bool clamps_always = false;
     static constexpr int unclamped_max_taps = 16;
 

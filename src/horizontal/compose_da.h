@@ -39,6 +39,7 @@ struct DestAlphaFamily {
     static constexpr bool dest_alpha = true;
     static constexpr bool source_alpha = false;
     static constexpr bool plain = false;  // the plain whole-pixel rule
+    static constexpr bool fast_alpha = false;  // the fast source-alpha rule
     static constexpr bool clamps_always = false;
     static constexpr int unclamped_max_taps = 8;
 

@@ -31,6 +31,7 @@ struct PlainFamily {
     static constexpr bool dest_alpha = false;
     static constexpr bool source_alpha = false;
     static constexpr bool plain = true;  // the plain whole-pixel rule
+    static constexpr bool fast_alpha = false;  // the fast source-alpha rule
     static constexpr bool clamps_always = false;
     static constexpr int unclamped_max_taps = 8;
 

@@ -45,6 +45,7 @@ struct SourceAlphaFamily {
     static constexpr bool dest_alpha = false;
     static constexpr bool source_alpha = true;
     static constexpr bool plain = false;  // the plain whole-pixel rule
+    static constexpr bool fast_alpha = false;  // the fast source-alpha rule
     static constexpr bool clamps_always = false;
     static constexpr int unclamped_max_taps = 4;
 
@@ -149,6 +150,8 @@ struct SourceAlphaFamily {
 
 // The fast form: colour in buffer units, level 4096, no clamp of the samples.
 struct SourceAlphaFastFamily : SourceAlphaFamily {
+    static constexpr bool fast_alpha = true;
+
     template <class Dst>
     static int32_t weight(const MapContext& c, int32_t hc)
     {

@@ -45,6 +45,7 @@ struct SourceDestAlphaFamily {
     static constexpr bool dest_alpha = true;
     static constexpr bool source_alpha = true;
     static constexpr bool plain = false;  // the plain whole-pixel rule
+    static constexpr bool fast_alpha = false;  // the fast source-alpha rule
     static constexpr bool clamps_always = true;
     static constexpr int unclamped_max_taps = 0;
 

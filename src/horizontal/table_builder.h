@@ -43,7 +43,7 @@ struct Kernels {
 
 // The source-alpha tables: slots 2 to 5 choose per call between the fast form
 // (colour in buffer units, alpha in 1/16384) and the general form.
-template <class Dst, template <class, int> class Bank = ScalarBank>
+template <class Dst, template <class, int> class Bank = ScalarBank, template <class> class Linear = ScalarLinear>
 struct SourceAlphaKernels : Kernels<Dst, SourceAlphaFamily, 0, SourceAlphaFamily, Bank> {
     using Base = Kernels<Dst, SourceAlphaFamily, 0, SourceAlphaFamily, Bank>;
     using Units = typename Base::Units;
@@ -52,7 +52,7 @@ struct SourceAlphaKernels : Kernels<Dst, SourceAlphaFamily, 0, SourceAlphaFamily
 
     static constexpr Kernel area = fast_or_general_C<Dst, AreaSampler<Units>, AreaSampler<FastArea>,
                                                      SourceAlphaFamily, SourceAlphaFastFamily, true>;
-    static constexpr Kernel linear = fast_or_general_C<Dst, LinearSampler<Units>, LinearSampler<Fast>,
+    static constexpr Kernel linear = fast_or_general_C<Dst, LinearSampler<Units>, Linear<Fast>,
                                                        SourceAlphaFamily, SourceAlphaFastFamily, Dst::pairs>;
     template <int T>
     static constexpr Kernel bank =
@@ -80,15 +80,15 @@ struct TableSet {
     static constexpr HorizontalKernelTable tables[13] = {
         make_table<Kernels<DstYuy2, PlainFamily, kNoAlpha, PlainFamily, Bank, Area, Linear>>(),
         make_table<Kernels<DstYuy2, DestAlphaFamily, kNoAlpha, DestAlphaFamily, Bank>>(),
-        make_table<SourceAlphaKernels<DstYuy2, Bank>>(),
+        make_table<SourceAlphaKernels<DstYuy2, Bank, Linear>>(),
         make_table<Kernels<DstYuy2, SourceDestAlphaFamily, 2, SourceDestAlphaFamily, Bank>>(),
         make_table<Kernels<DstW210, PlainFamily, kNoAlpha, PlainFamily, Bank, Area, Linear>, false>(),
         make_table<Kernels<DstW210, DestAlphaFamily, kNoAlpha, DestAlphaFamily, Bank>>(),
-        make_table<SourceAlphaKernels<DstW210, Bank>>(),
+        make_table<SourceAlphaKernels<DstW210, Bank, Linear>>(),
         make_table<Kernels<DstW210, SourceDestAlphaFamily, 2, SourceDestAlphaFamily, Bank>>(),
         make_table<Kernels<DstRgbq, PlainFamily, kNoAlpha, PlainFamily, Bank, Area, Linear>>(),
         make_table<Kernels<DstRgbq, DestAlphaFamily, kNoAlpha, DestAlphaFamily, Bank>>(),
-        make_table<SourceAlphaKernels<DstRgbq, Bank>>(),
+        make_table<SourceAlphaKernels<DstRgbq, Bank, Linear>>(),
         make_table<Kernels<DstRgbq, SourceDestAlphaFamily, 2, SourceDestAlphaFamily, Bank>>(),
         make_table<Kernels<DstAlpha, AlphaOnlyFamily, 2, AlphaOnlyBankFamily, Bank>>(),
     };

@@ -77,6 +77,17 @@ constexpr bool uses_plain_run()
         return false;
 }
 
+// Whether a sampler has a vector run of whole pixels for the fast form of the
+// source-alpha tables.
+template <class Sampler, class Family>
+constexpr bool uses_fast_alpha_run()
+{
+    if constexpr (requires { Sampler::has_fast_alpha_run; })
+        return Sampler::has_fast_alpha_run && Family::fast_alpha;
+    else
+        return false;
+}
+
 // Slots 2..11: the walk, with Sampler computing the samples and Family
 // compositing them.
 template <class Dst, class Sampler, class Family, bool RunInPairs>
@@ -107,6 +118,10 @@ void main_kernel_C(const MapContext& c, const StripRecord& s)
                 rem &= (1 << kRunShift) - 1;
                 if constexpr (uses_plain_run<Sampler, Family>()) {
                     smp.plain_run(c, d, n, clamp_whole);
+                    x += kRun * n;
+                    d = dst_pixel<Dst>(c, x);
+                } else if constexpr (uses_fast_alpha_run<Sampler, Family>()) {
+                    smp.fast_alpha_run(d, n);
                     x += kRun * n;
                     d = dst_pixel<Dst>(c, x);
                 } else {

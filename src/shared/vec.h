@@ -16,6 +16,18 @@
 namespace lorvex {
 inline namespace LORVEX_ISA_NAMESPACE {
 
+// Four bytes from or to any address, as a 32-bit integer.
+inline int32_t load32(const void* p)
+{
+    int32_t v;
+    __builtin_memcpy(&v, p, 4);
+    return v;
+}
+inline void store32(void* p, int32_t v)
+{
+    __builtin_memcpy(p, &v, 4);
+}
+
 #if defined(LORVEX_ISA_AVX2)
 struct Vec {
     using reg = __m256i;

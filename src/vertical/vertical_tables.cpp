@@ -56,6 +56,8 @@ namespace lorvex {
 #if defined(LORVEX_HAVE_X86_KERNELS)
 extern const VerticalKernelTable V_YUY2_SSE41, V_W210_SSE41, V_RGBQ_SSE41, V_ALPHA_SSE41;
 extern const VerticalKernelTable V_YUY2_AVX2, V_W210_AVX2, V_RGBQ_AVX2, V_ALPHA_AVX2;
+extern const VerticalKernelTable V_YUY2_STRAIGHT_SSE41, V_W210_STRAIGHT_SSE41, V_RGBQ_STRAIGHT_SSE41;
+extern const VerticalKernelTable V_YUY2_STRAIGHT_AVX2, V_W210_STRAIGHT_AVX2, V_RGBQ_STRAIGHT_AVX2;
 #endif
 
 const VerticalKernelTable* vertical_table_for(const VerticalKernelTable* table, SimdLevel level)
@@ -71,6 +73,9 @@ const VerticalKernelTable* vertical_table_for(const VerticalKernelTable* table, 
         {&V_W210, &V_W210_SSE41, &V_W210_AVX2},
         {&V_RGBQ, &V_RGBQ_SSE41, &V_RGBQ_AVX2},
         {&V_ALPHA, &V_ALPHA_SSE41, &V_ALPHA_AVX2},
+        {&V_YUY2_STRAIGHT, &V_YUY2_STRAIGHT_SSE41, &V_YUY2_STRAIGHT_AVX2},
+        {&V_W210_STRAIGHT, &V_W210_STRAIGHT_SSE41, &V_W210_STRAIGHT_AVX2},
+        {&V_RGBQ_STRAIGHT, &V_RGBQ_STRAIGHT_SSE41, &V_RGBQ_STRAIGHT_AVX2},
     };
     if (level != SimdLevel::scalar)
         for (const Twins& t : twins)

@@ -10,6 +10,7 @@
 #include "shared/banks.h"
 #include "shared/map_context.h"
 #include "shared/simd.h"
+#include "vertical/straight_kernels.h"
 #include "vertical/vertical_kernels.h"
 
 namespace lorvex {
@@ -159,6 +160,58 @@ TEST(VerticalLevels, BoxPathsAgreeAcrossTheSixteenBitLimit)
                 ctx.line = b.data();
                 (*vertical_table_for(c.table, level))[4](ctx, s);
                 ASSERT_EQ(a, b) << c.name << " box_mid " << mid << " level " << int(level);
+            }
+        }
+    }
+}
+
+TEST(VerticalLevels, StraightOneLineMatchesScalar)
+{
+    const auto levels = vector_levels();
+    if (levels.empty()) GTEST_SKIP() << "no vector level on this processor";
+    struct Straight {
+        const char* name;
+        const VerticalKernelTable* table;
+        int elements;
+        bool words;
+        int max_sample;
+    };
+    const Straight tables[] = {{"V_YUY2_STRAIGHT", &V_YUY2_STRAIGHT, 2, false, 255},
+                               {"V_W210_STRAIGHT", &V_W210_STRAIGHT, 2, true, 1023},
+                               {"V_RGBQ_STRAIGHT", &V_RGBQ_STRAIGHT, 4, false, 255}};
+    std::mt19937 rng(77);
+    for (const Straight& t : tables) {
+        const int bytes = t.words ? 2 : 1;
+        std::vector<uint8_t> colour(64 * 4 * 2);
+        std::vector<uint16_t> alpha(64);
+        for (int width = 1; width <= 2 * 16 + 1; ++width) {
+            for (size_t i = 0; i < colour.size(); i += bytes) {
+                const int v = int(rng() % uint32_t(t.max_sample + 1));
+                colour[i] = uint8_t(v);
+                if (t.words) colour[i + 1] = uint8_t(v >> 8);
+            }
+            for (auto& a : alpha) a = uint16_t(rng() % 3 == 0 ? (rng() % 2) * 4096 : rng() % 4097);
+            MapContext ctx;
+            ctx.lines[0] = colour.data();
+            ctx.lines2[0] = reinterpret_cast<const uint8_t*>(alpha.data());
+            StripRecord s{};
+            s.src_first = int32_t(rng() % 4) * 2;
+            s.src_end = s.src_first + width;
+            s.pad_left = int32_t(rng() % 3) * 2;
+            for (int slot : {2, 3}) {
+                std::vector<int16_t> a(2048, 0x5A5A), b(2048, 0x5A5A);
+                ctx.line = a.data() + 16;
+                ctx.line_a = a.data() + 1024;
+                (*t.table)[slot](ctx, s);
+                for (SimdLevel level : levels) {
+                    std::fill(b.begin(), b.end(), int16_t(0x5A5A));
+                    ctx.line = b.data() + 16;
+                    ctx.line_a = b.data() + 1024;
+                    const VerticalKernelTable* v = vertical_table_for(t.table, level);
+                    ASSERT_NE((*v)[slot], (*t.table)[slot]) << t.name;
+                    (*v)[slot](ctx, s);
+                    ASSERT_EQ(a, b) << t.name << " slot " << slot << " width " << width << " level " << int(level);
+                }
             }
         }
     }
