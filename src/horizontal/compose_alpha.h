@@ -22,25 +22,9 @@ namespace lorvex::horizontal {
 inline namespace LORVEX_ISA_NAMESPACE {
 
 template <bool Bank>
-struct AlphaOnlyFamilyT {
-    static constexpr bool dest_alpha = false;  // the image itself is the plane
-    static constexpr bool source_alpha = true;
-    static constexpr bool plain = false;  // the plain whole-pixel rule
-    static constexpr bool fast_alpha = false;  // the fast source-alpha rule
-    static constexpr bool clamps_always = false;
+struct AlphaOnlyFamilyT : FamilyTraits<true> {
+    static constexpr bool source_alpha = true;  // the image itself is the plane
     static constexpr int unclamped_max_taps = 16;
-
-    template <class Dst, class Sampler>
-    static constexpr bool clamp_whole_at_full_level()
-    {
-        return false;
-    }
-
-    template <class Dst>
-    static int32_t weight(const MapContext& c, int32_t hc)
-    {
-        return weight_c12(hc, c.vcover, c.level);
-    }
 
     template <class Dst, class Shape>
     static void whole(const MapContext& c, uint16_t* d, uint16_t*, const Px& px)

@@ -35,25 +35,8 @@
 namespace lorvex::horizontal {
 inline namespace LORVEX_ISA_NAMESPACE {
 
-struct DestAlphaFamily {
+struct DestAlphaFamily : FamilyTraits<true> {
     static constexpr bool dest_alpha = true;
-    static constexpr bool source_alpha = false;
-    static constexpr bool plain = false;  // the plain whole-pixel rule
-    static constexpr bool fast_alpha = false;  // the fast source-alpha rule
-    static constexpr bool clamps_always = false;
-    static constexpr int unclamped_max_taps = 8;
-
-    template <class Dst, class Sampler>
-    static constexpr bool clamp_whole_at_full_level()
-    {
-        return false;
-    }
-
-    template <class Dst>
-    static int32_t weight(const MapContext& c, int32_t hc)
-    {
-        return weight_c12(hc, c.vcover, c.level);
-    }
 
     template <class Dst, class Shape>
     static void whole(const MapContext& c, typename Dst::sample* d, uint16_t* da, const Px& px)

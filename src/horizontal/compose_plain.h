@@ -27,13 +27,8 @@
 namespace lorvex::horizontal {
 inline namespace LORVEX_ISA_NAMESPACE {
 
-struct PlainFamily {
-    static constexpr bool dest_alpha = false;
-    static constexpr bool source_alpha = false;
-    static constexpr bool plain = true;  // the plain whole-pixel rule
-    static constexpr bool fast_alpha = false;  // the fast source-alpha rule
-    static constexpr bool clamps_always = false;
-    static constexpr int unclamped_max_taps = 8;
+struct PlainFamily : FamilyTraits<false> {
+    static constexpr bool plain = true;
 
     // The RGBQ bank kernels of 4 taps and more limit the sample of a whole
     // pixel at full level whatever `clamp` says.
@@ -41,12 +36,6 @@ struct PlainFamily {
     static constexpr bool clamp_whole_at_full_level()
     {
         return !Dst::pairs && Sampler::taps >= 4;
-    }
-
-    template <class Dst>
-    static int32_t weight(const MapContext& c, int32_t hc)
-    {
-        return weight_c14(hc, c.vcover, c.level);
     }
 
     template <class Dst, class Shape>

@@ -41,25 +41,9 @@
 namespace lorvex::horizontal {
 inline namespace LORVEX_ISA_NAMESPACE {
 
-struct SourceAlphaFamily {
-    static constexpr bool dest_alpha = false;
+struct SourceAlphaFamily : FamilyTraits<false> {
     static constexpr bool source_alpha = true;
-    static constexpr bool plain = false;  // the plain whole-pixel rule
-    static constexpr bool fast_alpha = false;  // the fast source-alpha rule
-    static constexpr bool clamps_always = false;
     static constexpr int unclamped_max_taps = 4;
-
-    template <class Dst, class Sampler>
-    static constexpr bool clamp_whole_at_full_level()
-    {
-        return false;
-    }
-
-    template <class Dst>
-    static int32_t weight(const MapContext& c, int32_t hc)
-    {
-        return weight_c14(hc, c.vcover, c.level);
-    }
 
     template <class Dst, class Shape>
     static void whole(const MapContext& c, typename Dst::sample* d, uint16_t*, const Px& px)

@@ -7,6 +7,7 @@
 #include <cstdint>
 
 #include "shared/formats.h"
+#include "shared/map_context.h"
 
 namespace lorvex::horizontal {
 inline namespace LORVEX_ISA_NAMESPACE {
@@ -42,6 +43,32 @@ struct ShapeNone {  // alpha-only images: no colour samples
     static constexpr int n = 0;
     static constexpr int at[1] = {0};
     static constexpr bool chroma[1] = {false};
+};
+
+// What the walk asks of a composition family, with the common answers; each
+// family states where it differs. Weight12 picks the 12-bit weight c12 of a
+// partly covered pixel (tables with a destination alpha plane or alpha only)
+// over the 14-bit c14.
+template <bool Weight12>
+struct FamilyTraits {
+    static constexpr bool dest_alpha = false;     // writes the destination's alpha plane
+    static constexpr bool source_alpha = false;   // reads the buffer's alpha section
+    static constexpr bool plain = false;          // the plain whole-pixel rule
+    static constexpr bool fast_alpha = false;     // the fast source-alpha rule
+    static constexpr bool clamps_always = false;  // limits every sample whatever `clamp` says
+    static constexpr int unclamped_max_taps = 8;  // more taps than this always limit
+
+    template <class Dst, class Sampler>
+    static constexpr bool clamp_whole_at_full_level()
+    {
+        return false;
+    }
+
+    template <class Dst>
+    static int32_t weight(const MapContext& c, int32_t hc)
+    {
+        return Weight12 ? weight_c12(hc, c.vcover, c.level) : weight_c14(hc, c.vcover, c.level);
+    }
 };
 
 template <class Dst, class Shape>
