@@ -356,16 +356,17 @@ struct AreaSamplerV : AreaSampler<Units> {
     }
 };
 
-// The linear sampler with a vector run for the plain RGBQ tables: the four
-// samples of a pixel interpolated in 64-bit lanes (a sample times a 16-bit
-// fraction and the sum of two such need more than 32 bits), with the
-// rounding of the scalar rule.
+// The linear sampler with runs of whole pixels for the plain tables: RGBQ
+// interpolates the four samples of a pixel in 64-bit vector lanes (a sample
+// times a 16-bit fraction and the sum of two such need more than 32 bits),
+// 4:2:2 computes a pair's four samples straight into the destination; both
+// with the rounding of the scalar rule.
 template <class Units>
 struct LinearSamplerV : LinearSampler<Units> {
     using Base = LinearSampler<Units>;
     using Dst = typename Units::Dst;
     using Base::Base;
-    static constexpr bool has_plain_run = !Units::alpha && !Dst::alpha_only && !Dst::pairs;
+    static constexpr bool has_plain_run = !Units::alpha && !Dst::alpha_only;
     static constexpr bool has_fast_alpha_run = Units::alpha && Units::colour_shift == 0 &&
                                                Units::alpha_shift == 0 && !Dst::pairs && !Dst::alpha_only;
 
@@ -406,6 +407,39 @@ struct LinearSamplerV : LinearSampler<Units> {
     }
 
     void plain_run(const MapContext& c, typename Dst::sample* d, int32_t n, bool clamp)
+    {
+        if constexpr (Dst::pairs)
+            pair_run(c, d, n, clamp);
+        else
+            quad_run(c, d, n, clamp);
+    }
+
+    // 4:2:2: the two lumas and the pair's chroma of each pair, straight into
+    // the destination by the whole-pixel rule.
+    void pair_run(const MapContext& c, typename Dst::sample* d, int32_t n, bool clamp)
+    {
+        using T = typename Dst::sample;
+        constexpr int cs = Units::colour_shift;
+        const int32_t L = c.level;
+        const auto put = [&](T* at, int32_t v) {
+            if (clamp) v = clamp_to(v, 0, Dst::max);
+            *at = T(L == 4096 ? v : (int32_t(*at) * (4096 - L) + v * L + 2048) >> 12);
+        };
+        const int16_t* line = this->line;
+        for (int32_t k = 0; k < n; ++k, d += 4) {
+            const int32_t i = this->pos >> 16, f = this->pos & 0xFFFF;
+            const int32_t p1 = this->pos + this->step, i1 = p1 >> 16, f1 = p1 & 0xFFFF;
+            this->pos = p1 + this->step;
+            const int32_t j = i >> 1;
+            const int32_t w0 = (i & 1) ? 0x10000 - f : 0x20000 - f, w1 = (i & 1) ? 0x10000 + f : f;
+            put(d, mix_w16<cs>(int64_t(line[2 * i]) * (0x10000 - f) + int64_t(line[2 * i + 2]) * f));
+            put(d + 1, mix_w17<cs>(int64_t(line[4 * j + 1]) * w0 + int64_t(line[4 * j + 5]) * w1));
+            put(d + 2, mix_w16<cs>(int64_t(line[2 * i1]) * (0x10000 - f1) + int64_t(line[2 * i1 + 2]) * f1));
+            put(d + 3, mix_w17<cs>(int64_t(line[4 * j + 3]) * w0 + int64_t(line[4 * j + 7]) * w1));
+        }
+    }
+
+    void quad_run(const MapContext& c, typename Dst::sample* d, int32_t n, bool clamp)
     {
         using T = typename Dst::sample;
         constexpr int cs = Units::colour_shift;
