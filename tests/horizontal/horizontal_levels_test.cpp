@@ -7,6 +7,7 @@
 #include <gtest/gtest.h>
 
 #include <random>
+#include <string>
 #include <vector>
 
 #include "horizontal/horizontal_kernels.h"
@@ -106,6 +107,8 @@ TEST(HorizontalLevels, VectorKernelsMatchScalarOnRandomStrips)
             const size_t dst_bytes = size_t(s.x + pixels + 4) * t.bytes_per_pixel;
             std::vector<uint8_t> d0(dst_bytes + 64), a0((s.x + pixels + 4) * 2 + 64);
             for (auto& b : d0) b = uint8_t(rng());
+            if (std::string(t.name).rfind("H_W210", 0) == 0)  // ten-bit words, as a picture holds
+                for (size_t i = 1; i < d0.size(); i += 2) d0[i] &= 3;
             for (size_t i = 0; i < a0.size(); i += 2) {
                 const uint16_t w = uint16_t(rng() % 4097);
                 a0[i] = uint8_t(w);

@@ -433,13 +433,16 @@ TEST(VerticalKernels, EdgeKernelFollowsItsDecisionRules)
             set_column(src, e, l);
         }
         for (int ph = 0; ph < 16; ++ph) {
-            // pad_left is not added: the range is written from element 0.
+            // pad_left is not added: the samples are written from element 0.
             Call c(*L, src, 10, 4, 13, 6);
             c.ctx.vphase = ph;
             c.ctx.vbank = BANK_LINEAR[0][0];  // not read
             c.run(vslot::edge);
             const int first_byte = 4 * L->elements;
             const int n = L->pairs ? 2 * 14 - first_byte : 4 * 13 - first_byte;
+            // The rest of the strip's range (its pad_left pixels' worth)
+            // repeats the last pair or pixel written.
+            const int tail = 6 * L->elements;
             for (int e = -kLead; e < kElements; ++e) {
                 int want = kGuard;
                 if (e >= 0 && e < n) {
@@ -447,6 +450,8 @@ TEST(VerticalKernels, EdgeKernelFollowsItsDecisionRules)
                     int l[6];
                     for (int t = 0; t < 6; ++t) l[t] = src.get(8 + t, b);
                     want = (b & 1) == 0 ? edge_reference(edge_taps(ph), ph, l) : ((16 - ph) * l[2] + ph * l[3]) * 2;
+                } else if (e >= n && e < n + tail) {
+                    want = c.colour[e - 4];
                 }
                 ASSERT_EQ(c.colour[e], want) << L->name << " ph " << ph << " element " << e;
             }
