@@ -292,6 +292,32 @@ struct AreaSamplerV : AreaSampler<Units> {
     static void consume_quad(const int16_t* line, int32_t& p, int32_t& r, int32_t w, int64_t bias, int shift,
                              int32_t out[4])
     {
+#if defined(LORVEX_ISA_AVX2)
+        // In double precision, which holds these integer sums exactly (a
+        // sample times a width is below 2^31, a span's sum below 2^48), and
+        // where scaling by a power of two and flooring is the arithmetic
+        // shift.
+        __m256d acc = _mm256_set1_pd(double(bias));
+        const auto add = [&](int32_t at, int32_t n) {
+            const __m128i s = _mm_cvtepi16_epi32(_mm_loadl_epi64(reinterpret_cast<const __m128i*>(line + 4 * at)));
+            acc = _mm256_add_pd(acc, _mm256_mul_pd(_mm256_cvtepi32_pd(s), _mm256_set1_pd(double(n))));
+        };
+        int32_t span = 0x10000;
+        while (r < span) {
+            add(p, r);
+            span -= r;
+            ++p;
+            r = w;
+        }
+        add(p, span);
+        r -= span;
+        if (r == 0) {
+            ++p;
+            r = w;
+        }
+        const __m256d scaled = _mm256_floor_pd(_mm256_mul_pd(acc, _mm256_set1_pd(1.0 / double(int64_t(1) << shift))));
+        _mm_storeu_si128(reinterpret_cast<__m128i*>(out), _mm256_cvtpd_epi32(scaled));
+#else
         __m128i lo = _mm_set1_epi64x(bias), hi = lo;  // samples 0, 1 and 2, 3
         const auto add = [&](int32_t at, int32_t n) {
             const __m128i s = _mm_loadl_epi64(reinterpret_cast<const __m128i*>(line + 4 * at));
@@ -320,6 +346,7 @@ struct AreaSamplerV : AreaSampler<Units> {
         out[1] = _mm_extract_epi32(sl, 2);
         out[2] = _mm_cvtsi128_si32(sh);
         out[3] = _mm_extract_epi32(sh, 2);
+#endif
     }
 
     void generic_run(const MapContext& c, typename Dst::sample* d, int32_t n, bool clamp)
