@@ -33,6 +33,15 @@ inline __m128i fold128(__m256i v)
 }
 #endif
 
+// One sample of a whole pixel by the plain rule: limited when the call
+// clamps, mixed at a level other than 4096, stored with its low bits.
+template <class Dst>
+inline void put_whole(typename Dst::sample* at, int32_t v, bool clamp, int32_t level)
+{
+    if (clamp) v = clamp_to(v, 0, Dst::max);
+    *at = typename Dst::sample(level == 4096 ? v : (int32_t(*at) * (4096 - level) + v * level + 2048) >> 12);
+}
+
 template <class Units, int T>
 struct BankSamplerV {
     using Dst = typename Units::Dst;
@@ -355,11 +364,7 @@ struct AreaSamplerV : AreaSampler<Units> {
         constexpr int cs = Units::colour_shift;
         constexpr int64_t b16 = int64_t(1) << (15 + cs), b17 = int64_t(1) << (16 + cs);
         const int32_t L = c.level;
-        const auto put = [&](T* at, int64_t acc, int shift) {
-            int32_t v = int32_t(acc >> shift);
-            if (clamp) v = clamp_to(v, 0, Dst::max);
-            *at = T(L == 4096 ? v : (int32_t(*at) * (4096 - L) + v * L + 2048) >> 12);
-        };
+        const auto put = [&](T* at, int64_t acc, int shift) { put_whole<Dst>(at, int32_t(acc >> shift), clamp, L); };
         const int32_t w = this->w;
         for (int32_t k = 0; k < n; ++k) {
             if constexpr (Dst::pairs) {
@@ -375,7 +380,7 @@ struct AreaSamplerV : AreaSampler<Units> {
                 for (int half = 0; half < 2; ++half) {
                     int32_t v[4];
                     consume_quad(this->line, this->p, this->r, w, b16, 16 + cs, v);
-                    for (int e = 0; e < 4; ++e) put(d + 4 * half + e, int64_t(v[e]) << (16 + cs), 16 + cs);
+                    for (int e = 0; e < 4; ++e) put_whole<Dst>(d + 4 * half + e, v[e], clamp, L);
                 }
             }
             d += Dst::pairs ? 2 * Dst::bytes_per_pixel / sizeof(T) : 8;
@@ -448,10 +453,7 @@ struct LinearSamplerV : LinearSampler<Units> {
         using T = typename Dst::sample;
         constexpr int cs = Units::colour_shift;
         const int32_t L = c.level;
-        const auto put = [&](T* at, int32_t v) {
-            if (clamp) v = clamp_to(v, 0, Dst::max);
-            *at = T(L == 4096 ? v : (int32_t(*at) * (4096 - L) + v * L + 2048) >> 12);
-        };
+        const auto put = [&](T* at, int32_t v) { put_whole<Dst>(at, v, clamp, L); };
         const int16_t* line = this->line;
         for (int32_t k = 0; k < n; ++k, d += 4) {
             const int32_t i = this->pos >> 16, f = this->pos & 0xFFFF;
