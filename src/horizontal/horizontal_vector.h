@@ -274,25 +274,34 @@ struct AreaSamplerV : AreaSampler<Units> {
         return _mm_movemask_epi8(_mm_cmpgt_epi16(v, _mm_set1_epi16(int16_t(32767 - 16)))) == 0;
     }
 
-    // Consumes `span` of width from the walk (p, r) over components of N
-    // samples at base[p E + e C]: whole samples while they end inside the
-    // span, then the part of the next one. The same steps as the walk of
-    // sample_area.h, without its shortcuts.
-    template <int N, int E, int C>
-    static void consume(const int16_t* base, int32_t& p, int32_t& r, int32_t w, int32_t span, int64_t acc[N])
+    // Consumes `span` of width from the walk (p, r): whole samples while they
+    // end inside the span, then the part of the next one, calling add(sample,
+    // width) for each. The same steps as the walk of sample_area.h, without
+    // its shortcuts.
+    template <class Add>
+    static void walk_span(int32_t& p, int32_t& r, int32_t w, int32_t span, Add&& add)
     {
         while (r < span) {
-            for (int e = 0; e < N; ++e) acc[e] += int64_t(base[p * E + e * C]) * r;
+            add(p, r);
             span -= r;
             ++p;
             r = w;
         }
-        for (int e = 0; e < N; ++e) acc[e] += int64_t(base[p * E + e * C]) * span;
+        add(p, span);
         r -= span;
         if (r == 0) {
             ++p;
             r = w;
         }
+    }
+
+    // N components at base[p E + e C] summed into acc in 64 bits.
+    template <int N, int E, int C>
+    static void consume(const int16_t* base, int32_t& p, int32_t& r, int32_t w, int32_t span, int64_t acc[N])
+    {
+        walk_span(p, r, w, span, [&](int32_t at, int32_t n) {
+            for (int e = 0; e < N; ++e) acc[e] += int64_t(base[at * E + e * C]) * n;
+        });
     }
 
     // The four samples of an RGBQ pixel walked together in 64-bit lanes (a
@@ -311,19 +320,7 @@ struct AreaSamplerV : AreaSampler<Units> {
             const __m128i s = _mm_cvtepi16_epi32(_mm_loadl_epi64(reinterpret_cast<const __m128i*>(line + 4 * at)));
             acc = _mm256_add_pd(acc, _mm256_mul_pd(_mm256_cvtepi32_pd(s), _mm256_set1_pd(double(n))));
         };
-        int32_t span = 0x10000;
-        while (r < span) {
-            add(p, r);
-            span -= r;
-            ++p;
-            r = w;
-        }
-        add(p, span);
-        r -= span;
-        if (r == 0) {
-            ++p;
-            r = w;
-        }
+        walk_span(p, r, w, 0x10000, add);
         const __m256d scaled = _mm256_floor_pd(_mm256_mul_pd(acc, _mm256_set1_pd(1.0 / double(int64_t(1) << shift))));
         _mm_storeu_si128(reinterpret_cast<__m128i*>(out), _mm256_cvtpd_epi32(scaled));
 #else
@@ -334,19 +331,7 @@ struct AreaSamplerV : AreaSampler<Units> {
             lo = _mm_add_epi64(lo, _mm_mul_epi32(_mm_cvtepi16_epi64(s), nv));
             hi = _mm_add_epi64(hi, _mm_mul_epi32(_mm_cvtepi16_epi64(_mm_srli_si128(s, 4)), nv));
         };
-        int32_t span = 0x10000;
-        while (r < span) {
-            add(p, r);
-            span -= r;
-            ++p;
-            r = w;
-        }
-        add(p, span);
-        r -= span;
-        if (r == 0) {
-            ++p;
-            r = w;
-        }
+        walk_span(p, r, w, 0x10000, add);
         // The results fit 32 bits: the low half of a logical shift is the
         // arithmetic one's.
         const __m128i sl = _mm_srl_epi64(lo, _mm_cvtsi32_si128(shift));
