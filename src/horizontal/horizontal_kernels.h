@@ -23,6 +23,12 @@ extern const HorizontalKernelTable H_RGBQ_SA;
 extern const HorizontalKernelTable H_RGBQ_SA_DA;
 extern const HorizontalKernelTable H_ALPHA;
 
+// The thirteen tables above with vector samplers, one set per instruction
+// set, in the order of their declarations.
+constexpr int kHorizontalTables = 13;
+extern const std::array<HorizontalKernelTable, kHorizontalTables> horizontal_tables_isa_sse41;
+extern const std::array<HorizontalKernelTable, kHorizontalTables> horizontal_tables_isa_avx2;
+
 // The twin of a table whose samplers use the vectors of `level`, where one
 // exists; the table itself otherwise.
 const HorizontalKernelTable* horizontal_table_for(const HorizontalKernelTable* table, SimdLevel level);

@@ -24,21 +24,18 @@ constexpr HorizontalKernelTable H_RGBQ_SA = Scalar::tables[10];
 constexpr HorizontalKernelTable H_RGBQ_SA_DA = Scalar::tables[11];
 constexpr HorizontalKernelTable H_ALPHA = Scalar::tables[12];
 
-#if defined(LORVEX_HAVE_X86_KERNELS)
-extern const HorizontalKernelTable H_TABLES_SSE41[13];
-extern const HorizontalKernelTable H_TABLES_AVX2[13];
-#endif
-
 const HorizontalKernelTable* horizontal_table_for(const HorizontalKernelTable* table, SimdLevel level)
 {
 #if defined(LORVEX_HAVE_X86_KERNELS)
-    static constexpr const HorizontalKernelTable* scalar[13] = {
+    static constexpr const HorizontalKernelTable* scalar[kHorizontalTables] = {
         &H_YUY2, &H_YUY2_DA, &H_YUY2_SA, &H_YUY2_SA_DA, &H_W210, &H_W210_DA, &H_W210_SA,
         &H_W210_SA_DA, &H_RGBQ, &H_RGBQ_DA, &H_RGBQ_SA, &H_RGBQ_SA_DA, &H_ALPHA,
     };
     if (level != SimdLevel::scalar)
-        for (int i = 0; i < 13; ++i)
-            if (scalar[i] == table) return level == SimdLevel::avx2 ? &H_TABLES_AVX2[i] : &H_TABLES_SSE41[i];
+        for (int i = 0; i < kHorizontalTables; ++i)
+            if (scalar[i] == table)
+                return level == SimdLevel::avx2 ? &horizontal_tables_isa_avx2[size_t(i)]
+                                                : &horizontal_tables_isa_sse41[size_t(i)];
 #else
     (void)level;
 #endif

@@ -77,7 +77,7 @@ constexpr HorizontalKernelTable make_table()
 template <template <class, int> class Bank, template <class> class Area = ScalarArea,
           template <class> class Linear = ScalarLinear>
 struct TableSet {
-    static constexpr HorizontalKernelTable tables[13] = {
+    static constexpr std::array<HorizontalKernelTable, kHorizontalTables> tables = {
         make_table<Kernels<DstYuy2, PlainFamily, kNoAlpha, PlainFamily, Bank, Area, Linear>>(),
         make_table<Kernels<DstYuy2, DestAlphaFamily, kNoAlpha, DestAlphaFamily, Bank>>(),
         make_table<SourceAlphaKernels<DstYuy2, Bank, Linear>>(),

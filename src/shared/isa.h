@@ -12,3 +12,9 @@
 #else
 #define LORVEX_ISA_NAMESPACE isa_scalar
 #endif
+
+// A name with the instruction set appended, for what each vector source file
+// defines once: NAME_isa_sse41, NAME_isa_avx2.
+#define LORVEX_CAT_(a, b) a##_##b
+#define LORVEX_CAT(a, b) LORVEX_CAT_(a, b)
+#define LORVEX_ISA_NAME(name) LORVEX_CAT(name, LORVEX_ISA_NAMESPACE)

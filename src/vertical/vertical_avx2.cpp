@@ -1,22 +1,6 @@
-// The vertical tables with the AVX2 kernels in the slots they serve.
+// The vertical tables of this file's instruction set (AVX2).
 #include "vertical/vertical_vector.h"
 
 namespace lorvex {
-
-extern const VerticalKernelTable V_YUY2_AVX2;
-extern const VerticalKernelTable V_W210_AVX2;
-extern const VerticalKernelTable V_RGBQ_AVX2;
-extern const VerticalKernelTable V_ALPHA_AVX2;
-extern const VerticalKernelTable V_YUY2_STRAIGHT_AVX2;
-extern const VerticalKernelTable V_W210_STRAIGHT_AVX2;
-extern const VerticalKernelTable V_RGBQ_STRAIGHT_AVX2;
-
-constexpr VerticalKernelTable V_YUY2_AVX2 = vertical::make_vector_table<SrcYuy2, vertical::edge7_yuy2_C>();
-constexpr VerticalKernelTable V_W210_AVX2 = vertical::make_vector_table<SrcW210, nullptr>();
-constexpr VerticalKernelTable V_RGBQ_AVX2 = vertical::make_vector_table<SrcRgbq, vertical::edge7_rgbq_C>();
-constexpr VerticalKernelTable V_ALPHA_AVX2 = vertical::make_vector_table<SrcAlpha, nullptr>();
-constexpr VerticalKernelTable V_YUY2_STRAIGHT_AVX2 = vertical::make_straight_vector_table<SrcYuy2>();
-constexpr VerticalKernelTable V_W210_STRAIGHT_AVX2 = vertical::make_straight_vector_table<SrcW210>();
-constexpr VerticalKernelTable V_RGBQ_STRAIGHT_AVX2 = vertical::make_straight_vector_table<SrcRgbq>();
-
-}  // namespace lorvex
+constexpr std::array<VerticalKernelTable, kVectorVerticalTables> LORVEX_ISA_NAME(vertical_tables) = vertical::make_vector_tables();
+}

@@ -228,6 +228,13 @@ extern const VerticalKernelTable V_W210;
 extern const VerticalKernelTable V_RGBQ;
 extern const VerticalKernelTable V_ALPHA;
 
+// The tables with vector kernels, one set per instruction set, in the order
+// V_YUY2, V_W210, V_RGBQ, V_ALPHA, V_YUY2_STRAIGHT, V_W210_STRAIGHT,
+// V_RGBQ_STRAIGHT.
+constexpr int kVectorVerticalTables = 7;
+extern const std::array<VerticalKernelTable, kVectorVerticalTables> vertical_tables_isa_sse41;
+extern const std::array<VerticalKernelTable, kVectorVerticalTables> vertical_tables_isa_avx2;
+
 // The twin of a table whose kernels use the vectors of `level`, where one
 // exists; the table itself otherwise.
 const VerticalKernelTable* vertical_table_for(const VerticalKernelTable* table, SimdLevel level);

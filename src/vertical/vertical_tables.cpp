@@ -53,33 +53,17 @@ constexpr VerticalKernelTable V_RGBQ_STRAIGHT = vertical::make_straight_table<Sr
 
 namespace lorvex {
 
-#if defined(LORVEX_HAVE_X86_KERNELS)
-extern const VerticalKernelTable V_YUY2_SSE41, V_W210_SSE41, V_RGBQ_SSE41, V_ALPHA_SSE41;
-extern const VerticalKernelTable V_YUY2_AVX2, V_W210_AVX2, V_RGBQ_AVX2, V_ALPHA_AVX2;
-extern const VerticalKernelTable V_YUY2_STRAIGHT_SSE41, V_W210_STRAIGHT_SSE41, V_RGBQ_STRAIGHT_SSE41;
-extern const VerticalKernelTable V_YUY2_STRAIGHT_AVX2, V_W210_STRAIGHT_AVX2, V_RGBQ_STRAIGHT_AVX2;
-#endif
-
 const VerticalKernelTable* vertical_table_for(const VerticalKernelTable* table, SimdLevel level)
 {
 #if defined(LORVEX_HAVE_X86_KERNELS)
-    struct Twins {
-        const VerticalKernelTable* scalar;
-        const VerticalKernelTable* sse41;
-        const VerticalKernelTable* avx2;
-    };
-    static constexpr Twins twins[] = {
-        {&V_YUY2, &V_YUY2_SSE41, &V_YUY2_AVX2},
-        {&V_W210, &V_W210_SSE41, &V_W210_AVX2},
-        {&V_RGBQ, &V_RGBQ_SSE41, &V_RGBQ_AVX2},
-        {&V_ALPHA, &V_ALPHA_SSE41, &V_ALPHA_AVX2},
-        {&V_YUY2_STRAIGHT, &V_YUY2_STRAIGHT_SSE41, &V_YUY2_STRAIGHT_AVX2},
-        {&V_W210_STRAIGHT, &V_W210_STRAIGHT_SSE41, &V_W210_STRAIGHT_AVX2},
-        {&V_RGBQ_STRAIGHT, &V_RGBQ_STRAIGHT_SSE41, &V_RGBQ_STRAIGHT_AVX2},
+    static constexpr const VerticalKernelTable* scalar[kVectorVerticalTables] = {
+        &V_YUY2, &V_W210, &V_RGBQ, &V_ALPHA, &V_YUY2_STRAIGHT, &V_W210_STRAIGHT, &V_RGBQ_STRAIGHT,
     };
     if (level != SimdLevel::scalar)
-        for (const Twins& t : twins)
-            if (t.scalar == table) return level == SimdLevel::avx2 ? t.avx2 : t.sse41;
+        for (int i = 0; i < kVectorVerticalTables; ++i)
+            if (scalar[i] == table)
+                return level == SimdLevel::avx2 ? &vertical_tables_isa_avx2[size_t(i)]
+                                                : &vertical_tables_isa_sse41[size_t(i)];
 #else
     (void)level;
 #endif

@@ -307,5 +307,17 @@ constexpr VerticalKernelTable make_vector_table()
     };
 }
 
+// The tables of this instruction set, in the order declared beside
+// vertical_table_for.
+constexpr std::array<VerticalKernelTable, kVectorVerticalTables> make_vector_tables()
+{
+    return {
+        make_vector_table<SrcYuy2, edge7_yuy2_C>(), make_vector_table<SrcW210, nullptr>(),
+        make_vector_table<SrcRgbq, edge7_rgbq_C>(), make_vector_table<SrcAlpha, nullptr>(),
+        make_straight_vector_table<SrcYuy2>(),       make_straight_vector_table<SrcW210>(),
+        make_straight_vector_table<SrcRgbq>(),
+    };
+}
+
 }  // namespace LORVEX_ISA_NAMESPACE
 }  // namespace lorvex::vertical
