@@ -155,7 +155,124 @@ struct BankSamplerV {
         return _mm_hadd_epi32(t, _mm_shuffle_epi32(c, _MM_SHUFFLE(3, 1, 2, 0)));
     }
 
+    // Luma windows of up to eight elements fit a 128-bit register.
+    static constexpr bool kLumaHalf = Dst::pairs && kLumaWindow <= 8 && L > 8;
+
+    // Partial sums of the luma whose window and taps stand at these byte
+    // offsets: four 32-bit lanes, or a full register to be reduced with the
+    // others.
+    auto luma_dot(int32_t at, int32_t taps_at) const
+    {
+        const int16_t* w = byte_offset(line, at);
+        const int16_t* t = byte_offset(&cy[0][0], taps_at);
+        if constexpr (kLumaHalf)
+            return _mm_madd_epi16(_mm_loadu_si128(reinterpret_cast<const __m128i*>(w)),
+                                  _mm_load_si128(reinterpret_cast<const __m128i*>(t)));
+        else
+            return dot<kLumaRegs>(w, t);
+    }
+
+    static const int16_t* byte_offset(const int16_t* p, int32_t bytes)
+    {
+        return reinterpret_cast<const int16_t*>(reinterpret_cast<const char*>(p) + bytes);
+    }
+
+    // The partial sums of a pair reduced to [Y0 Y1 Cb Cr].
+    template <class Y>
+    static __m128i reduce_pair_sums(Y y0, Y y1, reg ch)
+    {
+#if defined(LORVEX_ISA_AVX2)
+        if constexpr (sizeof(Y) == 32) {
+            const __m256i t = _mm256_hadd_epi32(y0, y1);
+            return fold128(_mm256_hadd_epi32(t, _mm256_shuffle_epi32(ch, _MM_SHUFFLE(3, 1, 2, 0))));
+        } else
+#endif
+            return reduce_pair(fold128(y0), fold128(y1), fold128(ch));
+    }
+
+    // Runs of whole pairs, four at a time: the positions of a block are
+    // computed together, its sums reduced pair by pair, and its samples
+    // rounded, limited, mixed and stored together.
+    void pair_run(const MapContext& c, typename Dst::sample* d, int32_t n, bool clamp)
+    {
+        using S = typename Dst::sample;
+        constexpr int cs = Units::colour_shift;
+        const __m128i round = _mm_set1_epi32(1 << (13 + cs));
+        const __m128i top = _mm_set1_epi32(Dst::max), zero = _mm_setzero_si128();
+        const __m128i low = _mm_set1_epi32(sizeof(S) == 1 ? 0xFF : 0xFFFF);
+        const int32_t L = c.level;
+        const __m128i lv = _mm_set1_epi32(L), inv = _mm_set1_epi32(4096 - L), half = _mm_set1_epi32(2048);
+        // [Y0 Y1 Cb Cr] of four pairs back to the order in memory.
+        const __m128i order8 = _mm_setr_epi8(0, 2, 1, 3, 4, 6, 5, 7, 8, 10, 9, 11, 12, 14, 13, 15);
+        const __m128i order16 = _mm_setr_epi8(0, 1, 4, 5, 2, 3, 6, 7, 8, 9, 12, 13, 10, 11, 14, 15);
+        const __m128i steps = _mm_mullo_epi32(_mm_setr_epi32(0, 1, 2, 3), _mm_set1_epi32(step));
+        const __m128i four = _mm_set1_epi32(4 * step);
+        const __m128i fifteen = _mm_set1_epi32(15), one = _mm_set1_epi32(1);
+        alignas(16) int32_t luma_at[8], luma_ph[8], chroma_at[8], chroma_ph[8];
+        int32_t p = pos;
+        int32_t k = 0;
+        for (; k + 4 <= n; k += 4, d += 16) {
+            for (int h = 0; h < 2; ++h) {
+                const __m128i P = _mm_add_epi32(_mm_set1_epi32(p), h ? _mm_add_epi32(steps, four) : steps);
+                // Byte offsets: luma window 2(i - T) and chroma window
+                // 4(j - T) in the line, phase rows in the tap tables.
+                const __m128i i = _mm_srai_epi32(P, 16);
+                const __m128i ph = _mm_and_si128(_mm_srai_epi32(P, 12), fifteen);
+                const __m128i cph = _mm_add_epi32(_mm_srai_epi32(ph, 1), _mm_slli_epi32(_mm_and_si128(i, one), 3));
+                _mm_store_si128(reinterpret_cast<__m128i*>(luma_at + 4 * h),
+                                _mm_slli_epi32(_mm_sub_epi32(i, _mm_set1_epi32(T)), 2));
+                _mm_store_si128(reinterpret_cast<__m128i*>(luma_ph + 4 * h),
+                                _mm_mullo_epi32(ph, _mm_set1_epi32(int32_t(sizeof(cy[0])))));
+                _mm_store_si128(reinterpret_cast<__m128i*>(chroma_at + 4 * h),
+                                _mm_slli_epi32(_mm_sub_epi32(_mm_srai_epi32(i, 1), _mm_set1_epi32(T)), 3));
+                _mm_store_si128(reinterpret_cast<__m128i*>(chroma_ph + 4 * h),
+                                _mm_mullo_epi32(cph, _mm_set1_epi32(int32_t(sizeof(cc[0])))));
+            }
+            // The offsets are read back from memory, one load each, rather
+            // than extracted lane by lane.
+            asm volatile("" : : "r"(luma_at), "r"(luma_ph), "r"(chroma_at), "r"(chroma_ph) : "memory");
+            p += 8 * step;
+            __m128i v[4];
+            for (int m = 0; m < 4; ++m) {
+                const auto y0 = luma_dot(luma_at[2 * m], luma_ph[2 * m]);
+                const auto y1 = luma_dot(luma_at[2 * m + 1], luma_ph[2 * m + 1]);
+                const reg ch = dot<kChromaRegs>(byte_offset(line, chroma_at[2 * m]),
+                                                byte_offset(&cc[0][0], chroma_ph[2 * m]));
+                v[m] = _mm_srai_epi32(_mm_add_epi32(reduce_pair_sums(y0, y1, ch), round), 14 + cs);
+                if (clamp) v[m] = _mm_min_epi32(_mm_max_epi32(v[m], zero), top);
+                if (L != 4096) {
+                    __m128i D;
+                    if constexpr (sizeof(S) == 1)
+                        D = _mm_cvtepu8_epi32(_mm_cvtsi32_si128(load32(d + 4 * m)));
+                    else
+                        D = _mm_cvtepu16_epi32(_mm_loadl_epi64(reinterpret_cast<const __m128i*>(d + 4 * m)));
+                    D = _mm_shuffle_epi32(D, _MM_SHUFFLE(3, 1, 2, 0));
+                    v[m] = _mm_srai_epi32(
+                        _mm_add_epi32(_mm_add_epi32(_mm_mullo_epi32(D, inv), _mm_mullo_epi32(v[m], lv)), half), 12);
+                }
+                v[m] = _mm_and_si128(v[m], low);  // the low bits, as the scalar rule stores them
+            }
+            const __m128i a = _mm_packus_epi32(v[0], v[1]), b = _mm_packus_epi32(v[2], v[3]);
+            if constexpr (sizeof(S) == 1) {
+                _mm_storeu_si128(reinterpret_cast<__m128i*>(d), _mm_shuffle_epi8(_mm_packus_epi16(a, b), order8));
+            } else {
+                _mm_storeu_si128(reinterpret_cast<__m128i*>(d), _mm_shuffle_epi8(a, order16));
+                _mm_storeu_si128(reinterpret_cast<__m128i*>(d + 8), _mm_shuffle_epi8(b, order16));
+            }
+        }
+        pos = p;
+        if (k < n) single_run(c, d, n - k, clamp);
+    }
+
     void plain_run(const MapContext& c, typename Dst::sample* d, int32_t n, bool clamp)
+    {
+        if constexpr (Dst::pairs)
+            pair_run(c, d, n, clamp);
+        else
+            single_run(c, d, n, clamp);
+    }
+
+    void single_run(const MapContext& c, typename Dst::sample* d, int32_t n, bool clamp)
     {
         constexpr int cs = Units::colour_shift;
         const __m128i round = _mm_set1_epi32(1 << (13 + cs));
@@ -240,6 +357,25 @@ struct AreaSamplerV : AreaSampler<Units> {
             const int16_t* in = this->line + E * this->p;
             const __m128i half = _mm_set1_epi16(int16_t(1 << (Dst::buffer_shift - 1)));
             int32_t e = 0;
+#if defined(LORVEX_ISA_AVX2)
+            const __m256i half2 = _mm256_set1_epi16(int16_t(1 << (Dst::buffer_shift - 1)));
+            const __m256i near_top = _mm256_set1_epi16(int16_t(32767 - 16));
+            for (; e + 16 <= count; e += 16) {
+                const __m256i x = _mm256_loadu_si256((const __m256i*)(in + e));
+                if (!_mm256_testz_si256(_mm256_cmpgt_epi16(x, near_top), _mm256_cmpgt_epi16(x, near_top))) break;
+                const __m256i v = _mm256_srai_epi16(_mm256_add_epi16(x, half2), Dst::buffer_shift);
+                if constexpr (sizeof(T) == 1) {
+                    const __m256i m = clamp ? v : _mm256_and_si256(v, _mm256_set1_epi16(0xFF));
+                    const __m128i b = _mm_packus_epi16(_mm256_castsi256_si128(m), _mm256_extracti128_si256(m, 1));
+                    _mm_storeu_si128((__m128i*)(d + e), b);
+                } else {
+                    const __m256i w = clamp ? _mm256_min_epi16(_mm256_max_epi16(v, _mm256_setzero_si256()),
+                                                               _mm256_set1_epi16(int16_t(Dst::max)))
+                                            : v;
+                    _mm256_storeu_si256((__m256i*)(d + e), w);
+                }
+            }
+#endif
             for (; e + 8 <= count; e += 8) {
                 const __m128i v = _mm_srai_epi16(_mm_adds_epi16(_mm_loadu_si128((const __m128i*)(in + e)), half),
                                                  Dst::buffer_shift);
