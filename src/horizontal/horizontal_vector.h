@@ -66,6 +66,12 @@ struct BankSamplerV {
     alignas(32) int16_t cy2[Dst::pairs ? 1 : 16][kLumaRegs * L];
     alignas(32) int16_t cc[Dst::pairs ? 16 : 1][kChromaRegs > 0 ? kChromaRegs * L : 1];
     alignas(32) int16_t ca[Units::alpha ? 16 : 1][kAlphaRegs * L];
+    // The planar run of 4:2:2 (AVX2): per phase, the luma and the chroma taps
+    // contiguous, padded with zeros to whole 8-element chunks.
+    static constexpr bool kPlanar = Dst::pairs && !Units::alpha && L == 16;
+    static constexpr int kChunks = (taps + 7) / 8;
+    alignas(16) int16_t py[kPlanar ? 16 : 1][kChunks * 8];
+    alignas(16) int16_t pc[kPlanar ? 16 : 1][kChunks * 8];
 
     BankSamplerV(const MapContext& c, const StripRecord& s, bool)
         : line(c.line), line_a(c.line_a), pos(s.phase), step(c.hstep)
@@ -78,6 +84,12 @@ struct BankSamplerV {
                 const int16_t* crow = c.hbank_c + p * 16;
                 for (int e = 0; e < kChromaRegs * L; ++e) cc[p][e] = 0;
                 for (int k = 0; k < taps; ++k) cc[p][4 * k + 1] = cc[p][4 * k + 3] = crow[7 - T + k];
+                if constexpr (kPlanar) {
+                    for (int k = 0; k < kChunks * 8; ++k) {
+                        py[p][k] = k < taps ? row[7 - T + k] : 0;
+                        pc[p][k] = k < taps ? crow[7 - T + k] : 0;
+                    }
+                }
             } else {
                 for (int e = 0; e < kLumaRegs * L; ++e) cy2[p][e] = 0;
                 for (int k = 0; k < taps; ++k) {
@@ -264,8 +276,173 @@ struct BankSamplerV {
         if (k < n) single_run(c, d, n - k, clamp);
     }
 
+#if defined(LORVEX_ISA_AVX2)
+    // Pixels [b, b + count) of the 4:2:2 line (b even, count even) split
+    // into planes: luma from pixel b on, Cb and Cr from pair b / 2 on.
+    static void split(const int16_t* line, int32_t b, int32_t count, int16_t* y, int16_t* u, int16_t* v)
+    {
+        const int16_t* in = line + 2 * b;
+        // Per 128-bit lane Y0 Cb0 Y1 Cr0 Y2 Cb1 Y3 Cr1 -> Y0 Y1 Y2 Y3 Cb0 Cb1 Cr0 Cr1.
+        const __m256i lane = _mm256_setr_epi8(0, 1, 4, 5, 8, 9, 12, 13, 2, 3, 10, 11, 6, 7, 14, 15, 0, 1, 4, 5, 8, 9,
+                                              12, 13, 2, 3, 10, 11, 6, 7, 14, 15);
+        const __m256i chroma = _mm256_setr_epi32(0, 4, 2, 6, 1, 5, 3, 7);
+        int32_t k = 0;
+        for (; k + 16 <= count; k += 16) {
+            const __m256i a = _mm256_shuffle_epi8(_mm256_loadu_si256(reinterpret_cast<const __m256i*>(in + 2 * k)), lane);
+            const __m256i b2 =
+                _mm256_shuffle_epi8(_mm256_loadu_si256(reinterpret_cast<const __m256i*>(in + 2 * k + 16)), lane);
+            _mm256_storeu_si256(reinterpret_cast<__m256i*>(y + k),
+                                _mm256_permute4x64_epi64(_mm256_unpacklo_epi64(a, b2), 0xD8));
+            const __m256i uv = _mm256_permutevar8x32_epi32(_mm256_unpackhi_epi64(a, b2), chroma);
+            _mm_storeu_si128(reinterpret_cast<__m128i*>(u + k / 2), _mm256_castsi256_si128(uv));
+            _mm_storeu_si128(reinterpret_cast<__m128i*>(v + k / 2), _mm256_extracti128_si256(uv, 1));
+        }
+        for (; k < count; k += 2) {
+            y[k] = in[2 * k];
+            u[k / 2] = in[2 * k + 1];
+            y[k + 1] = in[2 * k + 2];
+            v[k / 2] = in[2 * k + 3];
+        }
+    }
+
+    // Runs of whole pairs with the line split into planes a chunk at a time:
+    // a pair's two luma windows and its Cb and Cr windows are then 8-element
+    // chunks of contiguous samples, two multiply-adds of 256 bits for up to
+    // eight taps, and two pairs reduce together to the order in memory.
+    void planar_run(const MapContext& c, typename Dst::sample* d, int32_t n, bool clamp)
+    {
+        if (c.level == 4096)
+            clamp ? planar_run<true, true>(c, d, n) : planar_run<false, true>(c, d, n);
+        else
+            clamp ? planar_run<true, false>(c, d, n) : planar_run<false, false>(c, d, n);
+    }
+
+    template <bool clamp, bool full>
+    void planar_run(const MapContext& c, typename Dst::sample* d, int32_t n)
+    {
+        using S = typename Dst::sample;
+        constexpr int cs = Units::colour_shift;
+        constexpr int kCap = 1024;                  // pixels of a chunk's planes
+        constexpr int kRowBytes = kChunks * 16;     // bytes of a phase's taps
+        constexpr int kRowShift = kChunks == 1 ? 4 : 5;
+        static_assert(kChunks <= 2 && kRowBytes == 1 << kRowShift);
+        // Pairs per chunk, in fours, so that the chunk's reach fits the planes.
+        const int32_t per_chunk =
+            int32_t((int64_t(kCap - 2 * T - 16 * kChunks - 8) << 16) / (2 * int64_t(step))) & ~3;
+        if (per_chunk < 4) {
+            pair_run(c, d, n, clamp);
+            return;
+        }
+        alignas(32) int16_t planes[2 * kCap + 32];
+        int16_t* const Y = planes;
+        int16_t* const U = planes + kCap;
+        int16_t* const V = planes + kCap + kCap / 2 + 16;
+        constexpr int32_t kToV = int32_t(kCap / 2 + 16) * 2;  // bytes from a Cb window to its Cr window
+
+        const __m256i round = _mm256_set1_epi32(1 << (13 + cs));
+        const __m256i top = _mm256_set1_epi32(Dst::max), zero = _mm256_setzero_si256();
+        const __m256i low = _mm256_set1_epi32(sizeof(S) == 1 ? 0xFF : 0xFFFF);
+        const int32_t L = c.level;
+        const __m256i lv = _mm256_set1_epi32(L), inv = _mm256_set1_epi32(4096 - L), half = _mm256_set1_epi32(2048);
+        const __m256i steps = _mm256_mullo_epi32(_mm256_setr_epi32(0, 1, 2, 3, 4, 5, 6, 7), _mm256_set1_epi32(step));
+        const __m256i fifteen = _mm256_set1_epi32(15), one = _mm256_set1_epi32(1);
+        alignas(32) int32_t y_at[8], y_row[8], c_at[8], c_row[8];
+
+        int32_t p = pos;
+        while (n >= 4) {
+            const int32_t m = n - (n & 3) < per_chunk ? n - (n & 3) : per_chunk;
+            const int32_t i_first = p >> 16;
+            const int32_t i_last = int32_t((int64_t(p) + int64_t(2 * m - 1) * step) >> 16);
+            const int32_t b = 2 * ((i_first >> 1) - T);
+            const int32_t luma_end = i_last - T + 8 * kChunks;
+            const int32_t chroma_end = 2 * ((i_last >> 1) - T + 8 * kChunks);
+            const int32_t e = luma_end > chroma_end ? luma_end + (luma_end & 1) : chroma_end;
+            split(line, b, e - b, Y, U, V);
+
+            const __m256i base_y = _mm256_set1_epi32(T + b), base_c = _mm256_set1_epi32(T + b / 2);
+            for (int32_t k = 0; k < m; k += 4, d += 16) {
+                // Byte offsets of the eight positions: luma windows in Y,
+                // chroma windows in U (and V), phase rows in py and pc.
+                const __m256i P = _mm256_add_epi32(_mm256_set1_epi32(p), steps);
+                const __m256i i = _mm256_srai_epi32(P, 16);
+                const __m256i ph = _mm256_and_si256(_mm256_srai_epi32(P, 12), fifteen);
+                const __m256i cph =
+                    _mm256_add_epi32(_mm256_srai_epi32(ph, 1), _mm256_slli_epi32(_mm256_and_si256(i, one), 3));
+                _mm256_store_si256(reinterpret_cast<__m256i*>(y_at), _mm256_slli_epi32(_mm256_sub_epi32(i, base_y), 1));
+                _mm256_store_si256(reinterpret_cast<__m256i*>(y_row), _mm256_slli_epi32(ph, kRowShift));
+                _mm256_store_si256(reinterpret_cast<__m256i*>(c_at),
+                                   _mm256_slli_epi32(_mm256_sub_epi32(_mm256_srai_epi32(i, 1), base_c), 1));
+                _mm256_store_si256(reinterpret_cast<__m256i*>(c_row), _mm256_slli_epi32(cph, kRowShift));
+                asm volatile("" : : "r"(y_at), "r"(y_row), "r"(c_at), "r"(c_row) : "memory");
+                p += 8 * step;
+                __m256i sums[4];
+                for (int q = 0; q < 4; ++q) {
+                    const int16_t* y0 = byte_offset(Y, y_at[2 * q]);
+                    const int16_t* y1 = byte_offset(Y, y_at[2 * q + 1]);
+                    const int16_t* t0 = byte_offset(&py[0][0], y_row[2 * q]);
+                    const int16_t* t1 = byte_offset(&py[0][0], y_row[2 * q + 1]);
+                    const int16_t* cb = byte_offset(U, c_at[2 * q]);
+                    const int16_t* tc = byte_offset(&pc[0][0], c_row[2 * q]);
+                    __m256i ys = _mm256_setzero_si256(), cs2 = _mm256_setzero_si256();
+                    for (int r = 0; r < kChunks; ++r) {
+                        const __m256i yw = _mm256_inserti128_si256(
+                            _mm256_castsi128_si256(_mm_loadu_si128(reinterpret_cast<const __m128i*>(y0 + 8 * r))),
+                            _mm_loadu_si128(reinterpret_cast<const __m128i*>(y1 + 8 * r)), 1);
+                        const __m256i yt = _mm256_inserti128_si256(
+                            _mm256_castsi128_si256(_mm_load_si128(reinterpret_cast<const __m128i*>(t0 + 8 * r))),
+                            _mm_load_si128(reinterpret_cast<const __m128i*>(t1 + 8 * r)), 1);
+                        const __m256i cw = _mm256_inserti128_si256(
+                            _mm256_castsi128_si256(_mm_loadu_si128(reinterpret_cast<const __m128i*>(cb + 8 * r))),
+                            _mm_loadu_si128(reinterpret_cast<const __m128i*>(byte_offset(cb, kToV) + 8 * r)), 1);
+                        const __m256i ct =
+                            _mm256_broadcastsi128_si256(_mm_load_si128(reinterpret_cast<const __m128i*>(tc + 8 * r)));
+                        ys = _mm256_add_epi32(ys, _mm256_madd_epi16(yw, yt));
+                        cs2 = _mm256_add_epi32(cs2, _mm256_madd_epi16(cw, ct));
+                    }
+                    // [Y0 Y0 Cb Cb | Y1 Y1 Cr Cr] partial sums
+                    sums[q] = _mm256_hadd_epi32(ys, cs2);
+                }
+                __m256i v[2];
+                for (int h = 0; h < 2; ++h) {
+                    // Two pairs: [Y0 Cb Y1 Cr | Y0 Cb Y1 Cr], as in memory.
+                    __m256i x = _mm256_permute4x64_epi64(_mm256_hadd_epi32(sums[2 * h], sums[2 * h + 1]), 0xD8);
+                    x = _mm256_srai_epi32(_mm256_add_epi32(x, round), 14 + cs);
+                    if constexpr (clamp) x = _mm256_min_epi32(_mm256_max_epi32(x, zero), top);
+                    if constexpr (!full) {
+                        const S* at = d + 8 * h;
+                        const __m256i D =
+                            sizeof(S) == 1
+                                ? _mm256_cvtepu8_epi32(_mm_loadl_epi64(reinterpret_cast<const __m128i*>(at)))
+                                : _mm256_cvtepu16_epi32(_mm_loadu_si128(reinterpret_cast<const __m128i*>(at)));
+                        x = _mm256_srai_epi32(
+                            _mm256_add_epi32(_mm256_add_epi32(_mm256_mullo_epi32(D, inv), _mm256_mullo_epi32(x, lv)),
+                                             half),
+                            12);
+                    }
+                    v[h] = _mm256_and_si256(x, low);  // the low bits, as the scalar rule stores them
+                }
+                const __m256i w = _mm256_permute4x64_epi64(_mm256_packus_epi32(v[0], v[1]), 0xD8);
+                if constexpr (sizeof(S) == 1)
+                    _mm_storeu_si128(reinterpret_cast<__m128i*>(d),
+                                     _mm_packus_epi16(_mm256_castsi256_si128(w), _mm256_extracti128_si256(w, 1)));
+                else
+                    _mm256_storeu_si256(reinterpret_cast<__m256i*>(d), w);
+            }
+            n -= m;
+        }
+        pos = p;
+        if (n > 0) single_run(c, d, n, clamp);
+    }
+#endif
+
     void plain_run(const MapContext& c, typename Dst::sample* d, int32_t n, bool clamp)
     {
+#if defined(LORVEX_ISA_AVX2)
+        if constexpr (kPlanar && kChunks <= 2) {
+            planar_run(c, d, n, clamp);
+            return;
+        }
+#endif
         if constexpr (Dst::pairs)
             pair_run(c, d, n, clamp);
         else

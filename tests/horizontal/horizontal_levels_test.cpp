@@ -6,6 +6,7 @@
 // buffers and destinations.
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <random>
 #include <string>
 #include <vector>
@@ -58,79 +59,113 @@ TEST(HorizontalLevels, VectorTablesHaveTheirOwnBankKernels)
         }
 }
 
+// One random strip of up to `max_pixels` destination pixels through a
+// table's slot at every vector level against the scalar kernel; returns the
+// number of comparisons made.
+int compare_random_strip(const Table& t, std::mt19937& rng, const std::vector<SimdLevel>& levels, int max_pixels,
+                         int iter)
+{
+    const int slot = 2 + int(rng() % 10);
+    const int T = slot >= 4 ? slot - 4 : 1;
+    LineBuffer buffer;
+    for (int16_t& v : buffer.storage) v = int16_t(int(rng() % 9000) - 400);
+    MapContext c;
+    c.line = buffer.line();
+    c.line_a = c.line + 8192;
+    for (int i = 0; i < 4096; ++i) c.line_a[i] = int16_t(rng() % 5 == 0 ? rng() % 18000 : rng() % 16385);
+    const int bank = int(rng() % 3);
+    const int16_t* rows[3] = {&BANK_CUBIC[rng() % 49][0][0], &BANK_LANCZOS3[rng() % 28][0][0],
+                              &BANK_SOFT[rng() % 113][0][0]};
+    c.hbank_y = rows[bank];
+    c.hbank_c = rows[(bank + 1) % 3];
+    c.hstep = 0x4000 + int32_t(rng() % 0x40000);
+    c.vcover = rng() % 3 == 0 ? 1 + int32_t(rng() % 16384) : 16384;
+    c.clamp = uint8_t(rng() % 3 == 0);
+    c.tile = uint8_t(rng() % 2);
+    c.dst_assoc = uint8_t(rng() % 3);
+    c.level = rng() % 3 ? 4096 : 4 * int32_t(1 + rng() % 2047);
+
+    StripRecord s{};
+    s.phase = ((8 + T) << 16) + int32_t(rng() % 0x10000);
+    if (slot == 2) {
+        // The area walk: sometimes exactly one sample per pixel from the
+        // start of a sample, sometimes any reduction.
+        const bool aligned = rng() % 2;
+        c.hstep = aligned ? 0x10000 : 128 + int32_t(rng() % 0x30000);
+        s.phase = aligned ? int32_t(rng() % 8) * 0x20000 : int32_t(rng() % 0x80000);
+        if (aligned) c.vcover = 16384;
+    }
+    // Long strips stay inside the line buffer: the tap paths read about
+    // pixels x hstep source pixels, the area path pixels / hstep.
+    const int64_t source_pixels = 3000;
+    const int64_t reach = slot == 2 ? (source_pixels * c.hstep) >> 16 : (source_pixels << 16) / c.hstep;
+    const int pixels = 1 + int(rng() % uint32_t(std::min<int64_t>(max_pixels, std::max<int64_t>(reach, 1))));
+    s.x = int32_t(rng() % 5);
+    const int32_t frac = rng() % 2 ? 0 : int32_t(rng() % 0x10000);
+    s.x16 = (s.x << 16) + frac;
+    s.width16 = (pixels << 16) - frac - (rng() % 2 ? int32_t(rng() % 0x10000) : 0);
+    if (s.width16 <= 0) s.width16 = 0x10000 - frac;
+    s.first_cover = std::min(0x10000 - frac, s.width16);
+
+    const size_t dst_bytes = size_t(s.x + pixels + 4) * t.bytes_per_pixel;
+    std::vector<uint8_t> d0(dst_bytes + 64), a0((s.x + pixels + 4) * 2 + 64);
+    for (auto& b : d0) b = uint8_t(rng());
+    if (std::string(t.name).rfind("H_W210", 0) == 0)  // ten-bit words, as a picture holds
+        for (size_t i = 1; i < d0.size(); i += 2) d0[i] &= 3;
+    for (size_t i = 0; i < a0.size(); i += 2) {
+        const uint16_t w = uint16_t(rng() % 4097);
+        a0[i] = uint8_t(w);
+        a0[i + 1] = uint8_t(w >> 8);
+    }
+    int compared = 0;
+    for (SimdLevel level : levels) {
+        std::vector<uint8_t> d1 = d0, d2 = d0, e1 = a0, e2 = a0;
+        c.dst_line = t.alpha_only ? nullptr : d1.data();
+        c.dst_line2 = t.alpha_only ? d1.data() : e1.data();
+        (*t.table)[slot](c, s);
+        c.dst_line = t.alpha_only ? nullptr : d2.data();
+        c.dst_line2 = t.alpha_only ? d2.data() : e2.data();
+        (*horizontal_table_for(t.table, level))[slot](c, s);
+        EXPECT_EQ(d1, d2) << t.name << " slot " << slot << " level " << int(level) << " iter " << iter << " hstep "
+                          << c.hstep << " phase " << s.phase << " x " << s.x << " width16 " << s.width16
+                          << " vcover " << c.vcover << " level " << c.level;
+        EXPECT_EQ(e1, e2) << t.name << " slot " << slot << " (alpha plane) iter " << iter;
+        if (d1 != d2 || e1 != e2) return -1;
+        ++compared;
+    }
+    return compared;
+}
+
 TEST(HorizontalLevels, VectorKernelsMatchScalarOnRandomStrips)
 {
     const auto levels = vector_levels();
     if (levels.empty()) GTEST_SKIP() << "no vector level on this processor";
     std::mt19937 rng(11222026);
     int compared = 0;
-    for (const Table& t : kTables) {
+    for (const Table& t : kTables)
         for (int iter = 0; iter < 100; ++iter) {
-            const int slot = 2 + int(rng() % 10);
-            const int T = slot >= 4 ? slot - 4 : 1;
-            LineBuffer buffer;
-            for (int16_t& v : buffer.storage) v = int16_t(int(rng() % 9000) - 400);
-            MapContext c;
-            c.line = buffer.line();
-            c.line_a = c.line + 8192;
-            for (int i = 0; i < 4096; ++i) c.line_a[i] = int16_t(rng() % 5 == 0 ? rng() % 18000 : rng() % 16385);
-            const int bank = int(rng() % 3);
-            const int16_t* rows[3] = {&BANK_CUBIC[rng() % 49][0][0], &BANK_LANCZOS3[rng() % 28][0][0],
-                                      &BANK_SOFT[rng() % 113][0][0]};
-            c.hbank_y = rows[bank];
-            c.hbank_c = rows[(bank + 1) % 3];
-            c.hstep = 0x4000 + int32_t(rng() % 0x40000);
-            c.vcover = rng() % 3 == 0 ? 1 + int32_t(rng() % 16384) : 16384;
-            c.clamp = uint8_t(rng() % 3 == 0);
-            c.tile = uint8_t(rng() % 2);
-            c.dst_assoc = uint8_t(rng() % 3);
-            c.level = rng() % 3 ? 4096 : 4 * int32_t(1 + rng() % 2047);
-
-            StripRecord s{};
-            const int pixels = 1 + int(rng() % 70);
-            s.x = int32_t(rng() % 5);
-            const int32_t frac = rng() % 2 ? 0 : int32_t(rng() % 0x10000);
-            s.x16 = (s.x << 16) + frac;
-            s.width16 = (pixels << 16) - frac - (rng() % 2 ? int32_t(rng() % 0x10000) : 0);
-            if (s.width16 <= 0) s.width16 = 0x10000 - frac;
-            s.first_cover = std::min(0x10000 - frac, s.width16);
-            s.phase = ((8 + T) << 16) + int32_t(rng() % 0x10000);
-            if (slot == 2) {
-                // The area walk: sometimes exactly one sample per pixel from
-                // the start of a sample, sometimes any reduction.
-                const bool aligned = rng() % 2;
-                c.hstep = aligned ? 0x10000 : 128 + int32_t(rng() % 0x30000);
-                s.phase = aligned ? int32_t(rng() % 8) * 0x20000 : int32_t(rng() % 0x80000);
-                if (aligned) c.vcover = 16384;
-            }
-
-            const size_t dst_bytes = size_t(s.x + pixels + 4) * t.bytes_per_pixel;
-            std::vector<uint8_t> d0(dst_bytes + 64), a0((s.x + pixels + 4) * 2 + 64);
-            for (auto& b : d0) b = uint8_t(rng());
-            if (std::string(t.name).rfind("H_W210", 0) == 0)  // ten-bit words, as a picture holds
-                for (size_t i = 1; i < d0.size(); i += 2) d0[i] &= 3;
-            for (size_t i = 0; i < a0.size(); i += 2) {
-                const uint16_t w = uint16_t(rng() % 4097);
-                a0[i] = uint8_t(w);
-                a0[i + 1] = uint8_t(w >> 8);
-            }
-            for (SimdLevel level : levels) {
-                std::vector<uint8_t> d1 = d0, d2 = d0, e1 = a0, e2 = a0;
-                c.dst_line = t.alpha_only ? nullptr : d1.data();
-                c.dst_line2 = t.alpha_only ? d1.data() : e1.data();
-                (*t.table)[slot](c, s);
-                c.dst_line = t.alpha_only ? nullptr : d2.data();
-                c.dst_line2 = t.alpha_only ? d2.data() : e2.data();
-                (*horizontal_table_for(t.table, level))[slot](c, s);
-                ASSERT_EQ(d1, d2) << t.name << " slot " << slot << " level " << int(level) << " iter " << iter
-                                  << " hstep " << c.hstep << " phase " << s.phase << " x " << s.x << " width16 "
-                                  << s.width16 << " vcover " << c.vcover << " level " << c.level;
-                ASSERT_EQ(e1, e2) << t.name << " slot " << slot << " (alpha plane) iter " << iter;
-                ++compared;
-            }
+            const int n = compare_random_strip(t, rng, levels, 70, iter);
+            ASSERT_GE(n, 0);
+            compared += n;
         }
-    }
     EXPECT_GT(compared, 1000);
+}
+
+// Whole lines: runs long enough to take the vector paths through several of
+// their blocks of work.
+TEST(HorizontalLevels, VectorKernelsMatchScalarOnLongStrips)
+{
+    const auto levels = vector_levels();
+    if (levels.empty()) GTEST_SKIP() << "no vector level on this processor";
+    std::mt19937 rng(20261122);
+    int compared = 0;
+    for (const Table& t : kTables)
+        for (int iter = 0; iter < 12; ++iter) {
+            const int n = compare_random_strip(t, rng, levels, 2500, iter);
+            ASSERT_GE(n, 0);
+            compared += n;
+        }
+    EXPECT_GT(compared, 100);
 }
 
 }  // namespace
