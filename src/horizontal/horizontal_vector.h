@@ -72,12 +72,33 @@ struct BankSamplerV {
     static constexpr int kChunks = (taps + 7) / 8;
     alignas(16) int16_t py[kPlanar ? 16 : 1][kChunks * 8];
     alignas(16) int16_t pc[kPlanar ? 16 : 1][kChunks * 8];
+    // The RGBQ run (AVX2) takes the window in groups of eight pixels, four to
+    // a register: interleaving pixel w with pixel w + 4 puts each sample's
+    // products for two taps into one 32-bit lane, in the sample's own lane
+    // order. Per phase and group: the taps of the low and the high
+    // interleave, (t0, t4) and (t2, t6), (t1, t5) and (t3, t7).
+    static constexpr bool kQuad = !Dst::pairs && !Dst::alpha_only && !Units::alpha && L == 16;
+    static constexpr int kGroups = (taps + 7) / 8;
+    alignas(32) int16_t qc[kQuad ? 16 : 1][kQuad ? kGroups * 32 : 1];
 
     BankSamplerV(const MapContext& c, const StripRecord& s, bool)
         : line(c.line), line_a(c.line_a), pos(s.phase), step(c.hstep)
     {
         for (int p = 0; p < 16; ++p) {
             const int16_t* row = c.hbank_y + p * 16;
+            if constexpr (kQuad) {
+                const auto tap = [&](int k) { return k < taps ? uint16_t(row[7 - T + k]) : uint16_t(0); };
+                const auto two = [&](int a, int b) { return _mm_set1_epi32(int32_t(tap(a) | uint32_t(tap(b)) << 16)); };
+                __m128i* q = reinterpret_cast<__m128i*>(qc[p]);
+                for (int g = 0; g < kGroups; ++g) {
+                    const int w = 8 * g;
+                    _mm_store_si128(q + 4 * g + 0, two(w + 0, w + 4));  // low interleave, first lane
+                    _mm_store_si128(q + 4 * g + 1, two(w + 2, w + 6));  // low interleave, second lane
+                    _mm_store_si128(q + 4 * g + 2, two(w + 1, w + 5));  // high interleave, first lane
+                    _mm_store_si128(q + 4 * g + 3, two(w + 3, w + 7));  // high interleave, second lane
+                }
+                continue;  // the RGBQ pixel samples from these taps alone
+            }
             for (int e = 0; e < kLumaRegs * L; ++e) cy[p][e] = 0;
             if constexpr (Dst::pairs) {
                 for (int k = 0; k < taps; ++k) cy[p][2 * k] = row[7 - T + k];
@@ -134,6 +155,13 @@ struct BankSamplerV {
                 px.s[1] = mix_bank<cs>(_mm_cvtsi128_si32(_mm_srli_si128(c, 0)));
                 px.s[2] = mix_bank<cs>(_mm_cvtsi128_si32(_mm_srli_si128(c, 4)));
             }
+        } else if constexpr (kQuad) {
+#if defined(LORVEX_ISA_AVX2)
+            alignas(16) int32_t v[4];
+            _mm_store_si128(reinterpret_cast<__m128i*>(v),
+                            fold128(quad_sums(8 * (i - T), ph * int32_t(sizeof(qc[0])))));
+            for (int e = 0; e < 4; ++e) px.s[e] = mix_bank<cs>(v[e]);
+#endif
         } else {
             // Lanes alternate first and third samples, second and fourth.
             const int16_t* w = line + 4 * (i - T);
@@ -435,11 +463,96 @@ struct BankSamplerV {
     }
 #endif
 
+#if defined(LORVEX_ISA_AVX2)
+    // The four sums of the RGBQ pixel whose window and taps stand at these
+    // byte offsets, as two 128-bit halves of partial sums.
+    __m256i quad_sums(int32_t at, int32_t row) const
+    {
+        const int16_t* w = byte_offset(line, at);
+        const int16_t* t = byte_offset(&qc[0][0], row);
+        __m256i acc = _mm256_setzero_si256();
+        for (int g = 0; g < kGroups; ++g) {
+            const __m256i a = _mm256_loadu_si256(reinterpret_cast<const __m256i*>(w + 32 * g));
+            const __m256i b = taps <= 8 * g + 4 ? _mm256_setzero_si256()
+                                                : _mm256_loadu_si256(reinterpret_cast<const __m256i*>(w + 32 * g + 16));
+            const __m256i lo = _mm256_madd_epi16(_mm256_unpacklo_epi16(a, b),
+                                                 _mm256_load_si256(reinterpret_cast<const __m256i*>(t + 32 * g)));
+            const __m256i hi = _mm256_madd_epi16(_mm256_unpackhi_epi16(a, b),
+                                                 _mm256_load_si256(reinterpret_cast<const __m256i*>(t + 32 * g + 16)));
+            acc = _mm256_add_epi32(acc, _mm256_add_epi32(lo, hi));
+        }
+        return acc;
+    }
+
+    void quad_run(const MapContext& c, typename Dst::sample* d, int32_t n, bool clamp)
+    {
+        if (c.level == 4096)
+            clamp ? quad_run<true, true>(c, d, n) : quad_run<false, true>(c, d, n);
+        else
+            clamp ? quad_run<true, false>(c, d, n) : quad_run<false, false>(c, d, n);
+    }
+
+    // Eight RGBQ pixels at a time: their offsets computed together, two
+    // pixels' sums folded together, and the eight stored at once.
+    template <bool clamp, bool full>
+    void quad_run(const MapContext& c, typename Dst::sample* d, int32_t n)
+    {
+        constexpr int cs = Units::colour_shift;
+        const __m256i round = _mm256_set1_epi32(1 << (13 + cs));
+        const __m256i top = _mm256_set1_epi32(Dst::max), zero = _mm256_setzero_si256();
+        const __m256i low = _mm256_set1_epi32(0xFF);
+        const int32_t L = c.level;
+        const __m256i lv = _mm256_set1_epi32(L), inv = _mm256_set1_epi32(4096 - L), half = _mm256_set1_epi32(2048);
+        const __m256i steps = _mm256_mullo_epi32(_mm256_setr_epi32(0, 1, 2, 3, 4, 5, 6, 7), _mm256_set1_epi32(step));
+        const __m256i fifteen = _mm256_set1_epi32(15), base = _mm256_set1_epi32(T);
+        const __m256i order = _mm256_setr_epi32(0, 4, 1, 5, 2, 6, 3, 7);
+        alignas(32) int32_t at[8], row[8];
+        int32_t p = pos;
+        int32_t k = 0;
+        for (; k + 8 <= n; k += 8, d += 32) {
+            const __m256i P = _mm256_add_epi32(_mm256_set1_epi32(p), steps);
+            _mm256_store_si256(reinterpret_cast<__m256i*>(at),
+                               _mm256_slli_epi32(_mm256_sub_epi32(_mm256_srai_epi32(P, 16), base), 3));
+            _mm256_store_si256(reinterpret_cast<__m256i*>(row),
+                               _mm256_mullo_epi32(_mm256_and_si256(_mm256_srai_epi32(P, 12), fifteen),
+                                                  _mm256_set1_epi32(int32_t(sizeof(qc[0])))));
+            asm volatile("" : : "r"(at), "r"(row) : "memory");
+            p += 8 * step;
+            __m256i v[4];
+            for (int q = 0; q < 4; ++q) {
+                const __m256i s0 = quad_sums(at[2 * q], row[2 * q]);
+                const __m256i s1 = quad_sums(at[2 * q + 1], row[2 * q + 1]);
+                // [pixel 2q | pixel 2q + 1]
+                __m256i x = _mm256_add_epi32(_mm256_permute2x128_si256(s0, s1, 0x20),
+                                             _mm256_permute2x128_si256(s0, s1, 0x31));
+                x = _mm256_srai_epi32(_mm256_add_epi32(x, round), 14 + cs);
+                if constexpr (clamp) x = _mm256_min_epi32(_mm256_max_epi32(x, zero), top);
+                if constexpr (!full) {
+                    const __m256i D = _mm256_cvtepu8_epi32(_mm_loadl_epi64(reinterpret_cast<const __m128i*>(d + 8 * q)));
+                    x = _mm256_srai_epi32(
+                        _mm256_add_epi32(_mm256_add_epi32(_mm256_mullo_epi32(D, inv), _mm256_mullo_epi32(x, lv)), half),
+                        12);
+                }
+                v[q] = _mm256_and_si256(x, low);  // the low bits, as the scalar rule stores them
+            }
+            // Lanes [0 2 | 1 3] and [4 6 | 5 7] after the two packs; back to order.
+            const __m256i w = _mm256_packus_epi16(_mm256_packus_epi32(v[0], v[1]), _mm256_packus_epi32(v[2], v[3]));
+            _mm256_storeu_si256(reinterpret_cast<__m256i*>(d), _mm256_permutevar8x32_epi32(w, order));
+        }
+        pos = p;
+        if (k < n) single_run(c, d, n - k, clamp);
+    }
+#endif
+
     void plain_run(const MapContext& c, typename Dst::sample* d, int32_t n, bool clamp)
     {
 #if defined(LORVEX_ISA_AVX2)
         if constexpr (kPlanar && kChunks <= 2) {
             planar_run(c, d, n, clamp);
+            return;
+        }
+        if constexpr (kQuad) {
+            quad_run(c, d, n, clamp);
             return;
         }
 #endif
@@ -473,6 +586,12 @@ struct BankSamplerV {
                 // [Y0 Y1 Cb Cr] to the order in memory, Y0 Cb Y1 Cr.
                 v = _mm_shuffle_epi32(reduce_pair(y0, y1, ch), _MM_SHUFFLE(3, 1, 2, 0));
                 pos = p1 + step;
+            } else if constexpr (kQuad) {
+#if defined(LORVEX_ISA_AVX2)
+                const int32_t i = pos >> 16, ph = (pos >> 12) & 15;
+                v = fold128(quad_sums(8 * (i - T), ph * int32_t(sizeof(qc[0]))));
+                pos += step;
+#endif
             } else {
                 const int32_t i = pos >> 16, ph = (pos >> 12) & 15;
                 const int16_t* w = line + 4 * (i - T);
