@@ -43,6 +43,7 @@ inline namespace LORVEX_ISA_NAMESPACE {
 
 struct SourceAlphaFamily : FamilyTraits<false> {
     static constexpr bool source_alpha = true;
+    static constexpr bool general_alpha = true;
     static constexpr int unclamped_max_taps = 4;
 
     template <class Dst, class Shape>
@@ -135,6 +136,7 @@ struct SourceAlphaFamily : FamilyTraits<false> {
 // The fast form: colour in buffer units, level 4096, no clamp of the samples.
 struct SourceAlphaFastFamily : SourceAlphaFamily {
     static constexpr bool fast_alpha = true;
+    static constexpr bool general_alpha = false;
 
     template <class Dst>
     static int32_t weight(const MapContext& c, int32_t hc)

@@ -835,11 +835,119 @@ struct LinearSamplerV : LinearSampler<Units> {
         return _mm_castps_si128(_mm_shuffle_ps(_mm_castsi128_ps(lo), _mm_castsi128_ps(hi), _MM_SHUFFLE(2, 0, 2, 0)));
     }
 
+    static constexpr bool has_general_alpha_run = Units::alpha && Units::alpha_shift == 0 && !Dst::pairs &&
+                                                  !Dst::alpha_only && Units::colour_shift == Dst::buffer_shift;
+
+#if defined(LORVEX_ISA_AVX2)
+    // The four samples of the RGBQ pixels at positions p0 and p1, in 32-bit
+    // lanes [first | second]: x = L(4i + e)(0x10000 - f) + L(4i + 4 + e) f
+    // fits 32 bits for any 16-bit samples (the products may wrap on the way,
+    // the sum does not), and (x + 2^(15 + cs)) >> (16 + cs) is taken as
+    // ((x >> cs) + 2^15) >> 16, the same floor without overflow.
+    template <int cs>
+    __m256i colour2(int32_t p0, int32_t p1) const
+    {
+        const __m256i w = _mm256_inserti128_si256(
+            _mm256_castsi128_si256(_mm_loadu_si128(reinterpret_cast<const __m128i*>(this->line + 4 * (p0 >> 16)))),
+            _mm_loadu_si128(reinterpret_cast<const __m128i*>(this->line + 4 * (p1 >> 16))), 1);
+        const __m256i a = _mm256_srai_epi32(_mm256_unpacklo_epi16(w, w), 16);
+        const __m256i b = _mm256_srai_epi32(_mm256_unpackhi_epi16(w, w), 16);
+        const __m256i f = _mm256_setr_m128i(_mm_set1_epi32(p0 & 0xFFFF), _mm_set1_epi32(p1 & 0xFFFF));
+        const __m256i x = _mm256_add_epi32(_mm256_slli_epi32(a, 16), _mm256_mullo_epi32(_mm256_sub_epi32(b, a), f));
+        return _mm256_srai_epi32(_mm256_add_epi32(_mm256_srai_epi32(x, cs), _mm256_set1_epi32(1 << 15)), 16);
+    }
+
+    // Source alpha at a position, in 1/16384.
+    int32_t alpha_at(int32_t p) const
+    {
+        const int32_t i = p >> 16, f = p & 0xFFFF;
+        return int32_t((int64_t(this->line_a[i]) * (0x10000 - f) + int64_t(this->line_a[i + 1]) * f + 32768) >> 16);
+    }
+
+    // Whole RGBQ pixels of the source-alpha tables, eight at a time, two to a
+    // register. Fast: colour in buffer units, D = (S13 + ((D m) >> 9) + 16) >> 5
+    // with m = 16384 - A, stored with its low bits. General, at level 4096: S
+    // in stored depth (limited when `clamp`), D = clamp(((D (16384 - A) +
+    // 8192) >> 14) + S), or where A is above 16384 clamp((S 16384) / A), the
+    // division in double precision (exact for these operands; truncation is
+    // the integer division's). A pixel whose A is below 1 keeps D. Returns the
+    // pixels drawn, a multiple of eight.
+    template <bool Fast>
+    int32_t alpha_run8(typename Dst::sample* d, int32_t n, bool clamp)
+    {
+        constexpr int cs = Fast ? 0 : Dst::buffer_shift;
+        const __m256i zero = _mm256_setzero_si256(), top = _mm256_set1_epi32(Dst::max);
+        const __m256i full = _mm256_set1_epi32(16384), one = _mm256_set1_epi32(1);
+        const __m256i order = _mm256_setr_epi32(0, 4, 1, 5, 2, 6, 3, 7);
+        int32_t p = this->pos;
+        const int32_t step = this->step;
+        int32_t k = 0;
+        for (; k + 8 <= n; k += 8, d += 32) {
+            __m256i v[4];
+            for (int q = 0; q < 4; ++q) {
+                const int32_t p0 = p, p1 = p + step;
+                p = p1 + step;
+                __m256i S = colour2<cs>(p0, p1);
+                const __m256i A = _mm256_setr_m128i(_mm_set1_epi32(alpha_at(p0)), _mm_set1_epi32(alpha_at(p1)));
+                const __m256i D = _mm256_cvtepu8_epi32(_mm_loadl_epi64(reinterpret_cast<const __m128i*>(d + 8 * q)));
+                __m256i out;
+                if constexpr (Fast) {
+                    const __m256i t = _mm256_srai_epi32(_mm256_mullo_epi32(D, _mm256_sub_epi32(full, A)), 9);
+                    out = _mm256_srai_epi32(_mm256_add_epi32(_mm256_add_epi32(S, t), _mm256_set1_epi32(16)), 5);
+                    out = _mm256_and_si256(out, _mm256_set1_epi32(0xFF));
+                } else {
+                    if (clamp) S = _mm256_min_epi32(_mm256_max_epi32(S, zero), top);
+                    const __m256i t = _mm256_srai_epi32(
+                        _mm256_add_epi32(_mm256_mullo_epi32(D, _mm256_sub_epi32(full, A)), _mm256_set1_epi32(8192)), 14);
+                    out = _mm256_add_epi32(t, S);
+                    const __m256i over = _mm256_cmpgt_epi32(A, full);
+                    if (!_mm256_testz_si256(over, over)) {
+                        const auto divide = [&](__m128i s, __m128i a) {
+                            const __m256d q = _mm256_div_pd(_mm256_cvtepi32_pd(_mm_slli_epi32(s, 14)), _mm256_cvtepi32_pd(a));
+                            return _mm256_cvttpd_epi32(q);
+                        };
+                        const __m256i r = _mm256_setr_m128i(
+                            divide(_mm256_castsi256_si128(S), _mm256_castsi256_si128(A)),
+                            divide(_mm256_extracti128_si256(S, 1), _mm256_extracti128_si256(A, 1)));
+                        out = _mm256_blendv_epi8(out, r, over);
+                    }
+                    out = _mm256_min_epi32(_mm256_max_epi32(out, zero), top);
+                }
+                // A below 1: the destination stays.
+                v[q] = _mm256_blendv_epi8(D, out, _mm256_cmpgt_epi32(A, _mm256_sub_epi32(one, one)));
+            }
+            const __m256i w = _mm256_packus_epi16(_mm256_packus_epi32(v[0], v[1]), _mm256_packus_epi32(v[2], v[3]));
+            _mm256_storeu_si256(reinterpret_cast<__m256i*>(d), _mm256_permutevar8x32_epi32(w, order));
+        }
+        this->pos = p;
+        return k;
+    }
+#endif
+
+    // The general source-alpha rule on whole RGBQ pixels at level 4096; other
+    // levels, and what is left of a run, take the walk's own loop.
+    int32_t general_alpha_run(const MapContext& c, typename Dst::sample* d, int32_t n, bool clamp)
+    {
+#if defined(LORVEX_ISA_AVX2)
+        if constexpr (has_general_alpha_run)
+            if (c.level == 4096) return alpha_run8<false>(d, n, clamp);
+#endif
+        (void)c, (void)d, (void)n, (void)clamp;
+        return 0;
+    }
+
     // The fast source-alpha rule on n whole RGBQ pixels: colour in buffer
     // units, D = (S13 + ((D m) >> 9) + 16) >> 5 with m = 16384 - A, nothing
     // written where A is below 1.
     void fast_alpha_run(typename Dst::sample* d, int32_t n)
     {
+#if defined(LORVEX_ISA_AVX2)
+        if constexpr (has_fast_alpha_run) {
+            const int32_t done = alpha_run8<true>(d, n, false);
+            d += 4 * done;
+            n -= done;
+        }
+#endif
         const __m128i bias = _mm_set1_epi64x(32768), shift = _mm_cvtsi32_si128(16);
         const __m128i sixteen = _mm_set1_epi32(16);
         for (int32_t k = 0; k < n; ++k, d += 4) {

@@ -55,6 +55,7 @@ struct FamilyTraits {
     static constexpr bool source_alpha = false;   // reads the buffer's alpha section
     static constexpr bool plain = false;          // the plain whole-pixel rule
     static constexpr bool fast_alpha = false;     // the fast source-alpha rule
+    static constexpr bool general_alpha = false;  // the general source-alpha rule
     static constexpr bool clamps_always = false;  // limits every sample whatever `clamp` says
     static constexpr int unclamped_max_taps = 8;  // more taps than this always limit
 

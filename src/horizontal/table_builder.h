@@ -52,7 +52,7 @@ struct SourceAlphaKernels : Kernels<Dst, SourceAlphaFamily, 0, SourceAlphaFamily
 
     static constexpr Kernel area = fast_or_general_C<Dst, AreaSampler<Units>, AreaSampler<FastArea>,
                                                      SourceAlphaFamily, SourceAlphaFastFamily, true>;
-    static constexpr Kernel linear = fast_or_general_C<Dst, LinearSampler<Units>, Linear<Fast>,
+    static constexpr Kernel linear = fast_or_general_C<Dst, Linear<Units>, Linear<Fast>,
                                                        SourceAlphaFamily, SourceAlphaFastFamily, Dst::pairs>;
     template <int T>
     static constexpr Kernel bank =

@@ -88,6 +88,17 @@ constexpr bool uses_fast_alpha_run()
         return false;
 }
 
+// Whether a sampler has a vector run of whole pixels for the general form of
+// the source-alpha tables; it may decline a call, or draw part of a run.
+template <class Sampler, class Family>
+constexpr bool uses_general_alpha_run()
+{
+    if constexpr (requires { Sampler::has_general_alpha_run; })
+        return Sampler::has_general_alpha_run && Family::general_alpha;
+    else
+        return false;
+}
+
 // Slots 2..11: the walk, with Sampler computing the samples and Family
 // compositing them.
 template <class Dst, class Sampler, class Family, bool RunInPairs>
@@ -125,7 +136,13 @@ void main_kernel_C(const MapContext& c, const StripRecord& s)
                     x += kRun * n;
                     d = dst_pixel<Dst>(c, x);
                 } else {
-                    for (int32_t k = 0; k < n; ++k) {
+                    int32_t k = 0;
+                    if constexpr (uses_general_alpha_run<Sampler, Family>()) {
+                        k = smp.general_alpha_run(c, d, n, clamp_whole);
+                        x += kRun * k;
+                        d = dst_pixel<Dst>(c, x);
+                    }
+                    for (; k < n; ++k) {
                         smp.sample(px, true, true);
                         smp.advance();
                         if (clamp_whole) limit<Dst, Even::n>(px);

@@ -175,89 +175,180 @@ void box_V(const MapContext& ctx, const StripRecord& s)
     if (e < sp.count) box_C<Src>(ctx, tail_strip<Src>(s, e));
 }
 
-// Slots 2 and 3 of the straight tables: one line premultiplied, in 32-bit
-// lanes (a sample less its offset times an alpha word needs more than 16
-// bits): colour P + base, alpha a x 4, both saturated to 16 bits as the
-// scalar form stores them.
+// The lanes of the straight kernels: a register of 32-bit lanes of colour
+// elements (a sample less its offset times an alpha word needs more than 16
+// bits), the alpha word of each element's owner (chroma: the even pixel of
+// its pair), and the narrowing that saturates to 16 bits as the scalar form
+// stores.
 template <class Src>
-void straight_one_line_V(const MapContext& ctx, const StripRecord& s)
-{
-    constexpr int E = Src::elements_per_pixel;
+struct StraightLanes {
 #if defined(LORVEX_ISA_AVX2)
-    constexpr int kLanes = 8;  // 32-bit lanes of a register
+    static constexpr int kLanes = 8;
     using reg = __m256i;
-    const auto load_v = [](const typename Src::sample* p) {
+    static reg load_v(const typename Src::sample* p)
+    {
         if constexpr (sizeof(typename Src::sample) == 1)
             return _mm256_cvtepu8_epi32(_mm_loadl_epi64((const __m128i*)p));
         else
             return _mm256_cvtepu16_epi32(_mm_loadu_si128((const __m128i*)p));
-    };
-    // The alpha word of each element's owner: 4 pixels of pairs, 2 of RGBQ.
-    const auto load_a = [](const uint16_t* a) {
-        // Exactly the pixels of the register: four words, or two for RGBQ.
+    }
+    // Exactly the pixels of the register: four words, or two for RGBQ.
+    static reg load_a(const uint16_t* a)
+    {
         const __m128i words = Src::pairs ? _mm_loadl_epi64((const __m128i*)a) : _mm_cvtsi32_si128(load32(a));
         const reg w = _mm256_castsi128_si256(_mm_cvtepu16_epi32(words));
         const reg idx = Src::pairs ? _mm256_setr_epi32(0, 0, 1, 0, 2, 2, 3, 2) : _mm256_setr_epi32(0, 0, 0, 0, 1, 1, 1, 1);
         return _mm256_permutevar8x32_epi32(w, idx);
-    };
-    const reg off = Src::pairs ? _mm256_setr_epi32(Src::luma_offset, Src::chroma_offset, Src::luma_offset,
-                                                   Src::chroma_offset, Src::luma_offset, Src::chroma_offset,
-                                                   Src::luma_offset, Src::chroma_offset)
-                               : _mm256_setzero_si256();
-    const __m128i base = Src::pairs ? _mm_setr_epi16(Src::luma_base, Src::chroma_base, Src::luma_base, Src::chroma_base,
-                                                     Src::luma_base, Src::chroma_base, Src::luma_base, Src::chroma_base)
-                                    : _mm_setzero_si128();
-    const auto narrow = [](reg v) { return _mm_packs_epi32(_mm256_castsi256_si128(v), _mm256_extracti128_si256(v, 1)); };
-    const auto sub = [](reg a, reg b) { return _mm256_sub_epi32(a, b); };
-    const auto mul = [](reg a, reg b) { return _mm256_mullo_epi32(a, b); };
-    const auto sra = [](reg a, int n) { return _mm256_srai_epi32(a, n); };
+    }
+    static reg offsets()
+    {
+        return Src::pairs ? _mm256_setr_epi32(Src::luma_offset, Src::chroma_offset, Src::luma_offset, Src::chroma_offset,
+                                              Src::luma_offset, Src::chroma_offset, Src::luma_offset, Src::chroma_offset)
+                          : _mm256_setzero_si256();
+    }
+    static __m128i bases()
+    {
+        return Src::pairs ? _mm_setr_epi16(Src::luma_base, Src::chroma_base, Src::luma_base, Src::chroma_base,
+                                           Src::luma_base, Src::chroma_base, Src::luma_base, Src::chroma_base)
+                          : _mm_setzero_si128();
+    }
+    static __m128i narrow(reg v) { return _mm_packs_epi32(_mm256_castsi256_si128(v), _mm256_extracti128_si256(v, 1)); }
+    static reg set1(int32_t v) { return _mm256_set1_epi32(v); }
+    static reg zero() { return _mm256_setzero_si256(); }
+    static reg add(reg a, reg b) { return _mm256_add_epi32(a, b); }
+    static reg sub(reg a, reg b) { return _mm256_sub_epi32(a, b); }
+    static reg mul(reg a, reg b) { return _mm256_mullo_epi32(a, b); }
+    static reg sra(reg a, int n) { return _mm256_srai_epi32(a, n); }
+    static void store(int16_t* out, __m128i v) { _mm_storeu_si128((__m128i*)out, v); }
 #else
-    constexpr int kLanes = 4;
+    static constexpr int kLanes = 4;
     using reg = __m128i;
-    const auto load_v = [](const typename Src::sample* p) {
+    static reg load_v(const typename Src::sample* p)
+    {
         if constexpr (sizeof(typename Src::sample) == 1)
             return _mm_cvtepu8_epi32(_mm_cvtsi32_si128(load32(p)));
         else
             return _mm_cvtepu16_epi32(_mm_loadl_epi64((const __m128i*)p));
-    };
-    const auto load_a = [](const uint16_t* a) {
-        // Exactly the pixels of the register: two words, or one for RGBQ.
+    }
+    // Exactly the pixels of the register: two words, or one for RGBQ.
+    static reg load_a(const uint16_t* a)
+    {
         const reg w = _mm_cvtepu16_epi32(_mm_cvtsi32_si128(Src::pairs ? load32(a) : int32_t(*a)));
         return Src::pairs ? _mm_shuffle_epi32(w, _MM_SHUFFLE(0, 1, 0, 0)) : _mm_shuffle_epi32(w, 0);
-    };
-    const reg off = Src::pairs ? _mm_setr_epi32(Src::luma_offset, Src::chroma_offset, Src::luma_offset, Src::chroma_offset)
-                               : _mm_setzero_si128();
-    const __m128i base = Src::pairs ? _mm_setr_epi16(Src::luma_base, Src::chroma_base, Src::luma_base, Src::chroma_base,
-                                                     0, 0, 0, 0)
-                                    : _mm_setzero_si128();
-    const auto narrow = [](reg v) { return _mm_packs_epi32(v, v); };
-    const auto sub = [](reg a, reg b) { return _mm_sub_epi32(a, b); };
-    const auto mul = [](reg a, reg b) { return _mm_mullo_epi32(a, b); };
-    const auto sra = [](reg a, int n) { return _mm_srai_epi32(a, n); };
-#endif
-    const Span<Src> sp(ctx, s);
-    const auto* v = src_row<Src>(ctx.lines[0]);
-    const auto* a = reinterpret_cast<const uint16_t*>(ctx.lines2[0]);
-    int32_t e = 0;
-    for (; e + kLanes <= sp.count; e += kLanes) {
-        const int32_t se = sp.first + e;
-        const reg p = sra(mul(sub(load_v(v + se), off), load_a(a + se / E)), Src::premul_shift);
-        const __m128i out = _mm_add_epi16(narrow(p), base);
-        if constexpr (kLanes == 8)
-            _mm_storeu_si128((__m128i*)(sp.out + e), out);
-        else
-            _mm_storel_epi64((__m128i*)(sp.out + e), out);
     }
-    // Alpha of the pixels the vector loop covered, four at a time.
+    static reg offsets()
+    {
+        return Src::pairs ? _mm_setr_epi32(Src::luma_offset, Src::chroma_offset, Src::luma_offset, Src::chroma_offset)
+                          : _mm_setzero_si128();
+    }
+    static __m128i bases()
+    {
+        return Src::pairs ? _mm_setr_epi16(Src::luma_base, Src::chroma_base, Src::luma_base, Src::chroma_base, 0, 0, 0, 0)
+                          : _mm_setzero_si128();
+    }
+    static __m128i narrow(reg v) { return _mm_packs_epi32(v, v); }
+    static reg set1(int32_t v) { return _mm_set1_epi32(v); }
+    static reg zero() { return _mm_setzero_si128(); }
+    static reg add(reg a, reg b) { return _mm_add_epi32(a, b); }
+    static reg sub(reg a, reg b) { return _mm_sub_epi32(a, b); }
+    static reg mul(reg a, reg b) { return _mm_mullo_epi32(a, b); }
+    static reg sra(reg a, int n) { return _mm_srai_epi32(a, n); }
+    static void store(int16_t* out, __m128i v) { _mm_storel_epi64((__m128i*)out, v); }
+#endif
+};
+
+// The alpha of the pixels [0, pixels) of a straight strip, four at a time:
+// (sum w_k a_k) >> 12 saturated, or a x 4 for one line.
+template <class Src, class Row, class Weight>
+inline void straight_alpha_V(const MapContext& ctx, const StripRecord& s, int32_t x0, int32_t pixels, int32_t n,
+                             Row row, Weight weight)
+{
     int16_t* out_a = ctx.line_a + s.pad_left;
-    const int32_t x0 = sp.first / E, pixels = e / E;
     int32_t x = 0;
     for (; x + 4 <= pixels; x += 4) {
-        const __m128i w = _mm_slli_epi32(_mm_cvtepu16_epi32(_mm_loadl_epi64((const __m128i*)(a + x0 + x))), 2);
+        __m128i sum = _mm_setzero_si128();
+        for (int32_t k = 0; k < n; ++k) {
+            const __m128i a = _mm_cvtepu16_epi32(
+                _mm_loadl_epi64((const __m128i*)(reinterpret_cast<const uint16_t*>(row(k).second) + x0 + x)));
+            sum = _mm_add_epi32(sum, _mm_mullo_epi32(a, _mm_set1_epi32(weight(k))));
+        }
+        const __m128i w = _mm_srai_epi32(sum, 12);
         _mm_storel_epi64((__m128i*)(out_a + x), _mm_packs_epi32(w, w));
     }
-    for (; x < pixels; ++x) out_a[x] = saturate_i16(int32_t(a[x0 + x]) * 4);
-    if (e < sp.count) straight_one_line_C<Src>(ctx, tail_strip<Src>(s, e));
+    for (; x < pixels; ++x) {
+        int32_t sum = 0;
+        for (int32_t k = 0; k < n; ++k)
+            sum += weight(k) * int32_t(reinterpret_cast<const uint16_t*>(row(k).second)[x0 + x]);
+        out_a[x] = saturate_i16(sum >> 12);
+    }
+}
+
+// The weighted sum of n premultiplied lines, as straight_sum: colour
+// saturate((sum w_k P_k) >> 14) + base with P_k = ((v_k - offset) a_k) >>
+// premul_shift, alpha (sum w_k a_k) >> 12; the elements the registers leave
+// take the scalar kernel `Tail`.
+template <class Src, Kernel Tail, class Row, class Weight>
+void straight_sum_V(const MapContext& ctx, const StripRecord& s, int32_t n, Row row, Weight weight)
+{
+    using V = StraightLanes<Src>;
+    constexpr int E = Src::elements_per_pixel;
+    const typename V::reg off = V::offsets();
+    const __m128i base = V::bases();
+    const Span<Src> sp(ctx, s);
+    int32_t e = 0;
+    for (; e + V::kLanes <= sp.count; e += V::kLanes) {
+        const int32_t se = sp.first + e;
+        typename V::reg sum = V::zero();
+        for (int32_t k = 0; k < n; ++k) {
+            const LinePair l = row(k);
+            const typename V::reg p = V::sra(
+                V::mul(V::sub(V::load_v(src_row<Src>(l.first) + se), off),
+                       V::load_a(reinterpret_cast<const uint16_t*>(l.second) + se / E)),
+                Src::premul_shift);
+            // One line: 16384 P >> 14 is P.
+            sum = n == 1 ? p : V::add(sum, V::mul(p, V::set1(weight(k))));
+        }
+        if (n != 1) sum = V::sra(sum, 14);
+        V::store(sp.out + e, _mm_add_epi16(V::narrow(sum), base));
+    }
+    straight_alpha_V<Src>(ctx, s, sp.first / E, e / E, n, row, weight);
+    if (e < sp.count) Tail(ctx, tail_strip<Src>(s, e));
+}
+
+// Slots 2 and 3 of the straight tables: one line premultiplied; colour P +
+// base, alpha a x 4.
+template <class Src>
+void straight_one_line_V(const MapContext& ctx, const StripRecord& s)
+{
+    straight_sum_V<Src, straight_one_line_C<Src>>(
+        ctx, s, 1, [&](int32_t) { return stride_line(ctx, 0); }, [](int32_t) { return 16384; });
+}
+
+// Slot 5 of the straight tables: two lines with weights 16384 - w and w.
+template <class Src>
+void straight_linear_V(const MapContext& ctx, const StripRecord& s)
+{
+    const int32_t w = ctx.vphase >> 2;
+    if (w == 0) {
+        straight_one_line_V<Src>(ctx, s);
+        return;
+    }
+    straight_sum_V<Src, straight_linear_C<Src>>(
+        ctx, s, 2, [&](int32_t k) { return stride_line(ctx, k); }, [&](int32_t k) { return k == 0 ? 16384 - w : w; });
+}
+
+// Slots 6..21 of the straight tables: 2T bank taps.
+template <class Src, int T, bool ByPointer>
+void straight_bank_V(const MapContext& ctx, const StripRecord& s)
+{
+    const int16_t* row = ctx.vbank + ctx.vphase * 16;
+    straight_sum_V<Src, straight_bank_C<Src, T, ByPointer>>(
+        ctx, s, 2 * T,
+        [&](int32_t i) {
+            const int k = int(i) + 1 - T;
+            return ByPointer ? LinePair{ctx.lines[k], ctx.lines2[k]} : stride_line(ctx, k);
+        },
+        [&](int32_t i) { return int32_t(row[7 + i + 1 - T]); });
 }
 
 }  // namespace LORVEX_ISA_NAMESPACE
@@ -266,30 +357,19 @@ void straight_one_line_V(const MapContext& ctx, const StripRecord& s)
 namespace lorvex::vertical {
 inline namespace LORVEX_ISA_NAMESPACE {
 
-// Slot 5 of the straight tables: at a weight of 0 it is the one-line kernel,
-// which has a vector form; the blend of two lines keeps the scalar one.
-template <class Src>
-void straight_linear_V(const MapContext& ctx, const StripRecord& s)
-{
-    if ((ctx.vphase >> 2) == 0)
-        straight_one_line_V<Src>(ctx, s);
-    else
-        straight_linear_C<Src>(ctx, s);
-}
-
-// A straight table: the one-line slots have vector forms.
+// A straight table: every slot but the box has a vector form.
 template <class Src>
 constexpr VerticalKernelTable make_straight_vector_table()
 {
     return {
         straight_pad_left_C<Src>,       straight_pad_right_C<Src>,      straight_one_line_V<Src>,
         straight_one_line_V<Src>,       straight_box_C<Src>,            straight_linear_V<Src>,
-        straight_bank_C<Src, 1, false>, straight_bank_C<Src, 2, false>, straight_bank_C<Src, 3, false>,
-        straight_bank_C<Src, 4, false>, straight_bank_C<Src, 5, false>, straight_bank_C<Src, 6, false>,
-        straight_bank_C<Src, 7, false>, straight_bank_C<Src, 8, false>, straight_bank_C<Src, 1, true>,
-        straight_bank_C<Src, 2, true>,  straight_bank_C<Src, 3, true>,  straight_bank_C<Src, 4, true>,
-        straight_bank_C<Src, 5, true>,  straight_bank_C<Src, 6, true>,  straight_bank_C<Src, 7, true>,
-        straight_bank_C<Src, 8, true>,  nullptr,                        nullptr,
+        straight_bank_V<Src, 1, false>, straight_bank_V<Src, 2, false>, straight_bank_V<Src, 3, false>,
+        straight_bank_V<Src, 4, false>, straight_bank_V<Src, 5, false>, straight_bank_V<Src, 6, false>,
+        straight_bank_V<Src, 7, false>, straight_bank_V<Src, 8, false>, straight_bank_V<Src, 1, true>,
+        straight_bank_V<Src, 2, true>,  straight_bank_V<Src, 3, true>,  straight_bank_V<Src, 4, true>,
+        straight_bank_V<Src, 5, true>,  straight_bank_V<Src, 6, true>,  straight_bank_V<Src, 7, true>,
+        straight_bank_V<Src, 8, true>,  nullptr,                        nullptr,
     };
 }
 

@@ -62,10 +62,18 @@ TEST(HorizontalLevels, VectorTablesHaveTheirOwnBankKernels)
 // One random strip of up to `max_pixels` destination pixels through a
 // table's slot at every vector level against the scalar kernel; returns the
 // number of comparisons made.
+// What a test fixes instead of drawing it at random.
+struct Fixed {
+    int slot = -1;          // -1: any main slot
+    int clamp = -1;         // -1: either
+    bool full = false;      // level 4096, whole lines
+    bool alpha_runs = false;// source alpha in runs of telling values
+};
+
 int compare_random_strip(const Table& t, std::mt19937& rng, const std::vector<SimdLevel>& levels, int max_pixels,
-                         int iter)
+                         int iter, const Fixed& fixed = {})
 {
-    const int slot = 2 + int(rng() % 10);
+    const int slot = fixed.slot >= 0 ? fixed.slot : 2 + int(rng() % 10);
     const int T = slot >= 4 ? slot - 4 : 1;
     LineBuffer buffer;
     for (int16_t& v : buffer.storage) v = int16_t(int(rng() % 9000) - 400);
@@ -73,6 +81,14 @@ int compare_random_strip(const Table& t, std::mt19937& rng, const std::vector<Si
     c.line = buffer.line();
     c.line_a = c.line + 8192;
     for (int i = 0; i < 4096; ++i) c.line_a[i] = int16_t(rng() % 5 == 0 ? rng() % 18000 : rng() % 16385);
+    if (fixed.alpha_runs)
+        for (int i = 0; i < 4096;) {
+            // Transparent, the least visible, half, opaque, overshooting, any.
+            const int16_t kinds[5] = {0, 1, 8192, 16384, int16_t(16385 + rng() % 3000)};
+            const int run = 1 + int(rng() % 12), kind = int(rng() % 6);
+            for (int k = 0; k < run && i < 4096; ++k, ++i)
+                c.line_a[i] = kind < 5 ? kinds[kind] : int16_t(rng() % 16385);
+        }
     const int bank = int(rng() % 3);
     const int16_t* rows[3] = {&BANK_CUBIC[rng() % 49][0][0], &BANK_LANCZOS3[rng() % 28][0][0],
                               &BANK_SOFT[rng() % 113][0][0]};
@@ -80,10 +96,14 @@ int compare_random_strip(const Table& t, std::mt19937& rng, const std::vector<Si
     c.hbank_c = rows[(bank + 1) % 3];
     c.hstep = 0x4000 + int32_t(rng() % 0x40000);
     c.vcover = rng() % 3 == 0 ? 1 + int32_t(rng() % 16384) : 16384;
-    c.clamp = uint8_t(rng() % 3 == 0);
+    c.clamp = uint8_t(fixed.clamp >= 0 ? fixed.clamp : rng() % 3 == 0);
     c.tile = uint8_t(rng() % 2);
     c.dst_assoc = uint8_t(rng() % 3);
     c.level = rng() % 3 ? 4096 : 4 * int32_t(1 + rng() % 2047);
+    if (fixed.full) {
+        c.level = 4096;
+        c.vcover = 16384;
+    }
 
     StripRecord s{};
     s.phase = ((8 + T) << 16) + int32_t(rng() % 0x10000);
@@ -149,6 +169,33 @@ TEST(HorizontalLevels, VectorKernelsMatchScalarOnRandomStrips)
             compared += n;
         }
     EXPECT_GT(compared, 1000);
+}
+
+// The source-alpha tables' whole-pixel runs, in both their forms (clamp on:
+// the general rule; off: the fast one), over alpha with runs of transparent,
+// opaque and overshooting pixels.
+TEST(HorizontalLevels, SourceAlphaRunsMatchScalar)
+{
+    const auto levels = vector_levels();
+    if (levels.empty()) GTEST_SKIP() << "no vector level on this processor";
+    std::mt19937 rng(5150);
+    int compared = 0;
+    for (const Table& t : kTables) {
+        if (std::string(t.name).find("_SA") == std::string::npos) continue;
+        for (int slot = 2; slot <= 6; ++slot)
+            for (int clamp = 0; clamp <= 1; ++clamp)
+                for (int iter = 0; iter < 3; ++iter) {
+                    Fixed f;
+                    f.slot = slot;
+                    f.clamp = clamp;
+                    f.full = true;
+                    f.alpha_runs = true;
+                    const int n = compare_random_strip(t, rng, levels, 600, iter, f);
+                    ASSERT_GE(n, 0);
+                    compared += n;
+                }
+    }
+    EXPECT_GT(compared, 50);
 }
 
 // Whole lines: runs long enough to take the vector paths through several of

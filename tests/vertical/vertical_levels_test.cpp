@@ -165,7 +165,10 @@ TEST(VerticalLevels, BoxPathsAgreeAcrossTheSixteenBitLimit)
     }
 }
 
-TEST(VerticalLevels, StraightOneLineMatchesScalar)
+// The straight tables' kernels (one line, linear, bank taps by stride and
+// through the pointer array) premultiply each line as they read it; random
+// colour and alpha lines, widths around the vector widths, random phases.
+TEST(VerticalLevels, StraightKernelsMatchScalar)
 {
     const auto levels = vector_levels();
     if (levels.empty()) GTEST_SKIP() << "no vector level on this processor";
@@ -179,11 +182,13 @@ TEST(VerticalLevels, StraightOneLineMatchesScalar)
     const Straight tables[] = {{"V_YUY2_STRAIGHT", &V_YUY2_STRAIGHT, 2, false, 255},
                                {"V_W210_STRAIGHT", &V_W210_STRAIGHT, 2, true, 1023},
                                {"V_RGBQ_STRAIGHT", &V_RGBQ_STRAIGHT, 4, false, 255}};
+    constexpr int kLines = 16, kPixels = 64;
     std::mt19937 rng(77);
     for (const Straight& t : tables) {
         const int bytes = t.words ? 2 : 1;
-        std::vector<uint8_t> colour(64 * 4 * 2);
-        std::vector<uint16_t> alpha(64);
+        const int32_t stride = kPixels * t.elements * bytes, stride2 = kPixels * 2;
+        std::vector<uint8_t> colour(size_t(stride) * kLines);
+        std::vector<uint16_t> alpha(size_t(kPixels) * kLines);
         for (int width = 1; width <= 2 * 16 + 1; ++width) {
             for (size_t i = 0; i < colour.size(); i += bytes) {
                 const int v = int(rng() % uint32_t(t.max_sample + 1));
@@ -192,13 +197,22 @@ TEST(VerticalLevels, StraightOneLineMatchesScalar)
             }
             for (auto& a : alpha) a = uint16_t(rng() % 3 == 0 ? (rng() % 2) * 4096 : rng() % 4097);
             MapContext ctx;
-            ctx.lines[0] = colour.data();
-            ctx.lines2[0] = reinterpret_cast<const uint8_t*>(alpha.data());
+            ctx.src_stride = stride;
+            ctx.src_stride2 = stride2;
+            // Line 0 in the middle, so that taps reach 7 lines up and 8 down.
+            for (int k = -7; k <= 8; ++k) {
+                ctx.lines[k] = colour.data() + ptrdiff_t(stride) * (7 + k);
+                ctx.lines2[k] = reinterpret_cast<const uint8_t*>(alpha.data() + kPixels * (7 + k));
+            }
             StripRecord s{};
             s.src_first = int32_t(rng() % 4) * 2;
             s.src_end = s.src_first + width;
             s.pad_left = int32_t(rng() % 3) * 2;
-            for (int slot : {2, 3}) {
+            const int16_t* banks[2] = {&BANK_CUBIC[rng() % 49][0][0], &BANK_LANCZOS3[rng() % 28][0][0]};
+            ctx.vbank = banks[rng() % 2];
+            for (int slot = 2; slot <= 21; ++slot) {
+                if (slot == 4) continue;  // the box keeps its scalar form
+                ctx.vphase = slot == 5 ? int32_t(rng() % 0x10000) : int32_t(rng() % 16);
                 std::vector<int16_t> a(2048, 0x5A5A), b(2048, 0x5A5A);
                 ctx.line = a.data() + 16;
                 ctx.line_a = a.data() + 1024;
