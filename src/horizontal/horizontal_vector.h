@@ -845,14 +845,20 @@ struct LinearSamplerV : LinearSampler<Units> {
     // the sum does not), and (x + 2^(15 + cs)) >> (16 + cs) is taken as
     // ((x >> cs) + 2^15) >> 16, the same floor without overflow.
     template <int cs>
-    __m256i colour2(int32_t p0, int32_t p1) const
+    __m256i colour2(int32_t at0, int32_t at1, __m256i f) const
     {
         const __m256i w = _mm256_inserti128_si256(
-            _mm256_castsi128_si256(_mm_loadu_si128(reinterpret_cast<const __m128i*>(this->line + 4 * (p0 >> 16)))),
-            _mm_loadu_si128(reinterpret_cast<const __m128i*>(this->line + 4 * (p1 >> 16))), 1);
+            _mm256_castsi128_si256(_mm_loadu_si128(reinterpret_cast<const __m128i*>(this->line + at0))),
+            _mm_loadu_si128(reinterpret_cast<const __m128i*>(this->line + at1)), 1);
         const __m256i a = _mm256_srai_epi32(_mm256_unpacklo_epi16(w, w), 16);
         const __m256i b = _mm256_srai_epi32(_mm256_unpackhi_epi16(w, w), 16);
-        const __m256i f = _mm256_setr_m128i(_mm_set1_epi32(p0 & 0xFFFF), _mm_set1_epi32(p1 & 0xFFFF));
+        return lerp_lanes<cs>(a, b, f);
+    }
+
+    // (a (0x10000 - f) + b f + 2^(15 + cs)) >> (16 + cs), lane by lane.
+    template <int cs>
+    static __m256i lerp_lanes(__m256i a, __m256i b, __m256i f)
+    {
         const __m256i x = _mm256_add_epi32(_mm256_slli_epi32(a, 16), _mm256_mullo_epi32(_mm256_sub_epi32(b, a), f));
         return _mm256_srai_epi32(_mm256_add_epi32(_mm256_srai_epi32(x, cs), _mm256_set1_epi32(1 << 15)), 16);
     }
@@ -881,14 +887,24 @@ struct LinearSamplerV : LinearSampler<Units> {
         const __m256i order = _mm256_setr_epi32(0, 4, 1, 5, 2, 6, 3, 7);
         int32_t p = this->pos;
         const int32_t step = this->step;
+        const __m256i steps = _mm256_mullo_epi32(_mm256_setr_epi32(0, 1, 2, 3, 4, 5, 6, 7), _mm256_set1_epi32(step));
+        alignas(32) int32_t at[8];
         int32_t k = 0;
         for (; k + 8 <= n; k += 8, d += 32) {
+            // Positions, fractions and the alpha of the eight pixels: each
+            // alpha pair a(i), a(i + 1) is one 32-bit load.
+            const __m256i P = _mm256_add_epi32(_mm256_set1_epi32(p), steps);
+            const __m256i i = _mm256_srai_epi32(P, 16), f = _mm256_and_si256(P, _mm256_set1_epi32(0xFFFF));
+            _mm256_store_si256(reinterpret_cast<__m256i*>(at), _mm256_slli_epi32(i, 2));
+            const __m256i g = _mm256_i32gather_epi32(reinterpret_cast<const int*>(this->line_a), i, 2);
+            const __m256i alpha =
+                lerp_lanes<0>(_mm256_srai_epi32(_mm256_slli_epi32(g, 16), 16), _mm256_srai_epi32(g, 16), f);
+            p += 8 * step;
             __m256i v[4];
             for (int q = 0; q < 4; ++q) {
-                const int32_t p0 = p, p1 = p + step;
-                p = p1 + step;
-                __m256i S = colour2<cs>(p0, p1);
-                const __m256i A = _mm256_setr_m128i(_mm_set1_epi32(alpha_at(p0)), _mm_set1_epi32(alpha_at(p1)));
+                const __m256i pick = _mm256_setr_epi32(2 * q, 2 * q, 2 * q, 2 * q, 2 * q + 1, 2 * q + 1, 2 * q + 1, 2 * q + 1);
+                __m256i S = colour2<cs>(at[2 * q], at[2 * q + 1], _mm256_permutevar8x32_epi32(f, pick));
+                const __m256i A = _mm256_permutevar8x32_epi32(alpha, pick);
                 const __m256i D = _mm256_cvtepu8_epi32(_mm_loadl_epi64(reinterpret_cast<const __m128i*>(d + 8 * q)));
                 __m256i out;
                 if constexpr (Fast) {
