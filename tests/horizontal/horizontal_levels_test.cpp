@@ -109,9 +109,15 @@ int compare_random_strip(const Table& t, std::mt19937& rng, const std::vector<Si
     s.phase = ((8 + T) << 16) + int32_t(rng() % 0x10000);
     if (slot == 2) {
         // The area walk: sometimes exactly one sample per pixel from the
-        // start of a sample, sometimes any reduction.
-        const bool aligned = rng() % 2;
-        c.hstep = aligned ? 0x10000 : 128 + int32_t(rng() % 0x30000);
+        // start of a sample, sometimes a reduction.
+        const int kind = int(rng() % 4);
+        const bool aligned = kind == 0;
+        // Aligned, any reduction, reductions of 1 to 4, and common ratios.
+        const int32_t common[5] = {0xAAAA, 0xAAAB, 0x8000, 0x5555, 0xC000};
+        c.hstep = kind == 0   ? 0x10000
+                  : kind == 1 ? 128 + int32_t(rng() % 0x30000)
+                  : kind == 2 ? 0x4000 + int32_t(rng() % 0xC000)
+                              : common[rng() % 5];
         s.phase = aligned ? int32_t(rng() % 8) * 0x20000 : int32_t(rng() % 0x80000);
         if (aligned) c.vcover = 16384;
     }
