@@ -42,6 +42,34 @@ inline void put_whole(typename Dst::sample* at, int32_t v, bool clamp, int32_t l
     *at = typename Dst::sample(level == 4096 ? v : (int32_t(*at) * (4096 - level) + v * level + 2048) >> 12);
 }
 
+#if defined(LORVEX_ISA_AVX2)
+// The plain whole-pixel rule on two RGBQ pixels in 32-bit lanes: limited
+// when Clamp, mixed with the destination at `d` when not Full, the low
+// bits kept as the scalar rule stores them.
+template <bool Clamp, bool Full>
+inline __m256i whole_rgbq2(__m256i y, const uint8_t* d, int32_t level)
+{
+    if constexpr (Clamp) y = _mm256_min_epi32(_mm256_max_epi32(y, _mm256_setzero_si256()), _mm256_set1_epi32(255));
+    if constexpr (!Full) {
+        const __m256i D = _mm256_cvtepu8_epi32(_mm_loadl_epi64(reinterpret_cast<const __m128i*>(d)));
+        y = _mm256_srai_epi32(_mm256_add_epi32(_mm256_add_epi32(_mm256_mullo_epi32(D, _mm256_set1_epi32(4096 - level)),
+                                                                _mm256_mullo_epi32(y, _mm256_set1_epi32(level))),
+                                               _mm256_set1_epi32(2048)),
+                              12);
+    }
+    return _mm256_and_si256(y, _mm256_set1_epi32(0xFF));
+}
+
+// Eight RGBQ pixels from four registers of two, in 32-bit lanes holding
+// bytes: packed (lanes [0 2 | 1 3] and [4 6 | 5 7]) and put back in order.
+inline void store_rgbq8(uint8_t* d, const __m256i v[4])
+{
+    const __m256i w = _mm256_packus_epi16(_mm256_packus_epi32(v[0], v[1]), _mm256_packus_epi32(v[2], v[3]));
+    _mm256_storeu_si256(reinterpret_cast<__m256i*>(d),
+                        _mm256_permutevar8x32_epi32(w, _mm256_setr_epi32(0, 4, 1, 5, 2, 6, 3, 7)));
+}
+#endif
+
 template <class Units, int T>
 struct BankSamplerV {
     using Dst = typename Units::Dst;
@@ -499,13 +527,9 @@ struct BankSamplerV {
     {
         constexpr int cs = Units::colour_shift;
         const __m256i round = _mm256_set1_epi32(1 << (13 + cs));
-        const __m256i top = _mm256_set1_epi32(Dst::max), zero = _mm256_setzero_si256();
-        const __m256i low = _mm256_set1_epi32(0xFF);
         const int32_t L = c.level;
-        const __m256i lv = _mm256_set1_epi32(L), inv = _mm256_set1_epi32(4096 - L), half = _mm256_set1_epi32(2048);
         const __m256i steps = _mm256_mullo_epi32(_mm256_setr_epi32(0, 1, 2, 3, 4, 5, 6, 7), _mm256_set1_epi32(step));
         const __m256i fifteen = _mm256_set1_epi32(15), base = _mm256_set1_epi32(T);
-        const __m256i order = _mm256_setr_epi32(0, 4, 1, 5, 2, 6, 3, 7);
         alignas(32) int32_t at[8], row[8];
         int32_t p = pos;
         int32_t k = 0;
@@ -526,18 +550,9 @@ struct BankSamplerV {
                 __m256i x = _mm256_add_epi32(_mm256_permute2x128_si256(s0, s1, 0x20),
                                              _mm256_permute2x128_si256(s0, s1, 0x31));
                 x = _mm256_srai_epi32(_mm256_add_epi32(x, round), 14 + cs);
-                if constexpr (clamp) x = _mm256_min_epi32(_mm256_max_epi32(x, zero), top);
-                if constexpr (!full) {
-                    const __m256i D = _mm256_cvtepu8_epi32(_mm_loadl_epi64(reinterpret_cast<const __m128i*>(d + 8 * q)));
-                    x = _mm256_srai_epi32(
-                        _mm256_add_epi32(_mm256_add_epi32(_mm256_mullo_epi32(D, inv), _mm256_mullo_epi32(x, lv)), half),
-                        12);
-                }
-                v[q] = _mm256_and_si256(x, low);  // the low bits, as the scalar rule stores them
+                v[q] = whole_rgbq2<clamp, full>(x, d + 8 * q, L);
             }
-            // Lanes [0 2 | 1 3] and [4 6 | 5 7] after the two packs; back to order.
-            const __m256i w = _mm256_packus_epi16(_mm256_packus_epi32(v[0], v[1]), _mm256_packus_epi32(v[2], v[3]));
-            _mm256_storeu_si256(reinterpret_cast<__m256i*>(d), _mm256_permutevar8x32_epi32(w, order));
+            store_rgbq8(d, v);
         }
         pos = p;
         if (k < n) single_run(c, d, n - k, clamp);
@@ -791,12 +806,7 @@ struct AreaSamplerV : AreaSampler<Units> {
         constexpr int cs = Units::colour_shift;
         const int32_t w = this->w;
         if (w < 0x8000 || this->r <= 0 || this->r > w || pixels < 8) return 0;
-        const __m256i round = _mm256_set1_epi32(1 << 15);
-        const __m256i top = _mm256_set1_epi32(Dst::max), zero = _mm256_setzero_si256();
-        const __m256i low = _mm256_set1_epi32(0xFF);
-        const int32_t L = c.level;
-        const __m256i lv = _mm256_set1_epi32(L), inv = _mm256_set1_epi32(4096 - L), half = _mm256_set1_epi32(2048);
-        const __m256i order = _mm256_setr_epi32(0, 4, 1, 5, 2, 6, 3, 7);
+        const __m256i round = _mm256_set1_epi32(1 << 15), zero = _mm256_setzero_si256();
         const __m256i W = _mm256_set1_epi32(w), span = _mm256_set1_epi32(0x10000);
         const __m256d Wd = _mm256_set1_pd(double(w));
         const __m256i lanes = _mm256_slli_epi32(_mm256_setr_epi32(0, 1, 2, 3, 4, 5, 6, 7), 16);
@@ -834,18 +844,10 @@ struct AreaSamplerV : AreaSampler<Units> {
                     _mm256_add_epi32(_mm256_mullo_epi32(s0, _mm256_permutevar8x32_epi32(n0, pick)),
                                      _mm256_mullo_epi32(s1, _mm256_permutevar8x32_epi32(n1, pick))),
                     _mm256_mullo_epi32(s2, _mm256_permutevar8x32_epi32(n2, pick)));
-                __m256i y = _mm256_srai_epi32(_mm256_add_epi32(_mm256_srai_epi32(x, cs), round), 16);
-                if constexpr (clamp) y = _mm256_min_epi32(_mm256_max_epi32(y, zero), top);
-                if constexpr (!full) {
-                    const __m256i D = _mm256_cvtepu8_epi32(_mm_loadl_epi64(reinterpret_cast<const __m128i*>(d + 8 * m)));
-                    y = _mm256_srai_epi32(
-                        _mm256_add_epi32(_mm256_add_epi32(_mm256_mullo_epi32(D, inv), _mm256_mullo_epi32(y, lv)), half),
-                        12);
-                }
-                v[m] = _mm256_and_si256(y, low);  // the low bits, as the scalar rule stores them
+                const __m256i y = _mm256_srai_epi32(_mm256_add_epi32(_mm256_srai_epi32(x, cs), round), 16);
+                v[m] = whole_rgbq2<clamp, full>(y, d + 8 * m, c.level);
             }
-            const __m256i out = _mm256_packus_epi16(_mm256_packus_epi32(v[0], v[1]), _mm256_packus_epi32(v[2], v[3]));
-            _mm256_storeu_si256(reinterpret_cast<__m256i*>(d), _mm256_permutevar8x32_epi32(out, order));
+            store_rgbq8(d, v);
         }
         // The walk after the run: u0 is where the next pixel begins.
         this->p += u0 / w;
@@ -974,7 +976,6 @@ struct LinearSamplerV : LinearSampler<Units> {
         constexpr int cs = Fast ? 0 : Dst::buffer_shift;
         const __m256i zero = _mm256_setzero_si256(), top = _mm256_set1_epi32(Dst::max);
         const __m256i full = _mm256_set1_epi32(16384), one = _mm256_set1_epi32(1);
-        const __m256i order = _mm256_setr_epi32(0, 4, 1, 5, 2, 6, 3, 7);
         int32_t p = this->pos;
         const int32_t step = this->step;
         const __m256i steps = _mm256_mullo_epi32(_mm256_setr_epi32(0, 1, 2, 3, 4, 5, 6, 7), _mm256_set1_epi32(step));
@@ -1022,8 +1023,7 @@ struct LinearSamplerV : LinearSampler<Units> {
                 // A below 1: the destination stays.
                 v[q] = _mm256_blendv_epi8(D, out, _mm256_cmpgt_epi32(A, _mm256_sub_epi32(one, one)));
             }
-            const __m256i w = _mm256_packus_epi16(_mm256_packus_epi32(v[0], v[1]), _mm256_packus_epi32(v[2], v[3]));
-            _mm256_storeu_si256(reinterpret_cast<__m256i*>(d), _mm256_permutevar8x32_epi32(w, order));
+            store_rgbq8(d, v);
         }
         this->pos = p;
         return k;
@@ -1099,10 +1099,46 @@ struct LinearSamplerV : LinearSampler<Units> {
         }
     }
 
+#if defined(LORVEX_ISA_AVX2)
+    // Eight whole RGBQ pixels at a time by the plain rule, two to a register,
+    // interpolated in 32-bit lanes as colour2 does. Returns the pixels drawn.
+    template <bool clamp, bool full>
+    int32_t quad_run8(const MapContext& c, typename Dst::sample* d, int32_t n)
+    {
+        constexpr int cs = Units::colour_shift;
+        int32_t p = this->pos;
+        const int32_t step = this->step;
+        const __m256i steps = _mm256_mullo_epi32(_mm256_setr_epi32(0, 1, 2, 3, 4, 5, 6, 7), _mm256_set1_epi32(step));
+        alignas(32) int32_t at[8];
+        int32_t k = 0;
+        for (; k + 8 <= n; k += 8, d += 32) {
+            const __m256i P = _mm256_add_epi32(_mm256_set1_epi32(p), steps);
+            const __m256i f = _mm256_and_si256(P, _mm256_set1_epi32(0xFFFF));
+            _mm256_store_si256(reinterpret_cast<__m256i*>(at), _mm256_slli_epi32(_mm256_srai_epi32(P, 16), 2));
+            p += 8 * step;
+            __m256i v[4];
+            for (int q = 0; q < 4; ++q) {
+                const __m256i pick = _mm256_setr_epi32(2 * q, 2 * q, 2 * q, 2 * q, 2 * q + 1, 2 * q + 1, 2 * q + 1, 2 * q + 1);
+                const __m256i S = colour2<cs>(at[2 * q], at[2 * q + 1], _mm256_permutevar8x32_epi32(f, pick));
+                v[q] = whole_rgbq2<clamp, full>(S, d + 8 * q, c.level);
+            }
+            store_rgbq8(d, v);
+        }
+        this->pos = p;
+        return k;
+    }
+#endif
+
     void quad_run(const MapContext& c, typename Dst::sample* d, int32_t n, bool clamp)
     {
         using T = typename Dst::sample;
         constexpr int cs = Units::colour_shift;
+#if defined(LORVEX_ISA_AVX2)
+        const int32_t done = c.level == 4096 ? (clamp ? quad_run8<true, true>(c, d, n) : quad_run8<false, true>(c, d, n))
+                                             : (clamp ? quad_run8<true, false>(c, d, n) : quad_run8<false, false>(c, d, n));
+        d += 4 * done;
+        n -= done;
+#endif
         const __m128i bias = _mm_set1_epi64x(int64_t(1) << (15 + cs));
         const __m128i shift = _mm_cvtsi32_si128(16 + cs);
         const __m128i top = _mm_set1_epi32(Dst::max), zero = _mm_setzero_si128();

@@ -131,17 +131,25 @@ void straight_linear_C(const MapContext& ctx, const StripRecord& s)
 }
 
 // Slots 6..13 and 14..21: 2T bank taps by stride or through the pointer array.
+// Line i of 2T bank taps (tap k = i + 1 - T) and its weight.
+template <int T, bool ByPointer>
+inline LinePair bank_line(const MapContext& ctx, int32_t i)
+{
+    const int k = int(i) + 1 - T;
+    return ByPointer ? LinePair{ctx.lines[k], ctx.lines2[k]} : stride_line(ctx, k);
+}
+template <int T>
+inline int32_t bank_weight(const MapContext& ctx, int32_t i)
+{
+    return ctx.vbank[ctx.vphase * 16 + 7 + i + 1 - T];
+}
+
 template <class Src, int T, bool ByPointer>
 void straight_bank_C(const MapContext& ctx, const StripRecord& s)
 {
-    const int16_t* row = ctx.vbank + ctx.vphase * 16;
     straight_sum<Src>(
-        ctx, s, 2 * T,
-        [&](int32_t i) {
-            const int k = int(i) + 1 - T;
-            return ByPointer ? LinePair{ctx.lines[k], ctx.lines2[k]} : stride_line(ctx, k);
-        },
-        [&](int32_t i) { return int32_t(row[7 + i + 1 - T]); });
+        ctx, s, 2 * T, [&](int32_t i) { return bank_line<T, ByPointer>(ctx, i); },
+        [&](int32_t i) { return bank_weight<T>(ctx, i); });
 }
 
 }  // namespace LORVEX_ISA_NAMESPACE

@@ -341,14 +341,9 @@ void straight_linear_V(const MapContext& ctx, const StripRecord& s)
 template <class Src, int T, bool ByPointer>
 void straight_bank_V(const MapContext& ctx, const StripRecord& s)
 {
-    const int16_t* row = ctx.vbank + ctx.vphase * 16;
     straight_sum_V<Src, straight_bank_C<Src, T, ByPointer>>(
-        ctx, s, 2 * T,
-        [&](int32_t i) {
-            const int k = int(i) + 1 - T;
-            return ByPointer ? LinePair{ctx.lines[k], ctx.lines2[k]} : stride_line(ctx, k);
-        },
-        [&](int32_t i) { return int32_t(row[7 + i + 1 - T]); });
+        ctx, s, 2 * T, [&](int32_t i) { return bank_line<T, ByPointer>(ctx, i); },
+        [&](int32_t i) { return bank_weight<T>(ctx, i); });
 }
 
 }  // namespace LORVEX_ISA_NAMESPACE
