@@ -13,6 +13,8 @@
 // line buffer's storage) are weighed by zero.
 #pragma once
 
+#include <algorithm>
+
 #include "horizontal/compose_plain.h"
 #include "horizontal/sample_area.h"
 #include "horizontal/sample_taps.h"
@@ -43,6 +45,34 @@ inline void put_whole(typename Dst::sample* at, int32_t v, bool clamp, int32_t l
 }
 
 #if defined(LORVEX_ISA_AVX2)
+// Pixels [b, b + count) of the 4:2:2 line (b even, count even) split
+// into planes: luma from pixel b on, Cb and Cr from pair b / 2 on.
+inline void split_422(const int16_t* line, int32_t b, int32_t count, int16_t* y, int16_t* u, int16_t* v)
+{
+    const int16_t* in = line + 2 * b;
+    // Per 128-bit lane Y0 Cb0 Y1 Cr0 Y2 Cb1 Y3 Cr1 -> Y0 Y1 Y2 Y3 Cb0 Cb1 Cr0 Cr1.
+    const __m256i lane = _mm256_setr_epi8(0, 1, 4, 5, 8, 9, 12, 13, 2, 3, 10, 11, 6, 7, 14, 15, 0, 1, 4, 5, 8, 9,
+                                          12, 13, 2, 3, 10, 11, 6, 7, 14, 15);
+    const __m256i chroma = _mm256_setr_epi32(0, 4, 2, 6, 1, 5, 3, 7);
+    int32_t k = 0;
+    for (; k + 16 <= count; k += 16) {
+        const __m256i a = _mm256_shuffle_epi8(_mm256_loadu_si256(reinterpret_cast<const __m256i*>(in + 2 * k)), lane);
+        const __m256i b2 =
+            _mm256_shuffle_epi8(_mm256_loadu_si256(reinterpret_cast<const __m256i*>(in + 2 * k + 16)), lane);
+        _mm256_storeu_si256(reinterpret_cast<__m256i*>(y + k),
+                            _mm256_permute4x64_epi64(_mm256_unpacklo_epi64(a, b2), 0xD8));
+        const __m256i uv = _mm256_permutevar8x32_epi32(_mm256_unpackhi_epi64(a, b2), chroma);
+        _mm_storeu_si128(reinterpret_cast<__m128i*>(u + k / 2), _mm256_castsi256_si128(uv));
+        _mm_storeu_si128(reinterpret_cast<__m128i*>(v + k / 2), _mm256_extracti128_si256(uv, 1));
+    }
+    for (; k < count; k += 2) {
+        y[k] = in[2 * k];
+        u[k / 2] = in[2 * k + 1];
+        y[k + 1] = in[2 * k + 2];
+        v[k / 2] = in[2 * k + 3];
+    }
+}
+
 // The plain whole-pixel rule on two RGBQ pixels in 32-bit lanes: limited
 // when Clamp, mixed with the destination at `d` when not Full, the low
 // bits kept as the scalar rule stores them.
@@ -333,34 +363,6 @@ struct BankSamplerV {
     }
 
 #if defined(LORVEX_ISA_AVX2)
-    // Pixels [b, b + count) of the 4:2:2 line (b even, count even) split
-    // into planes: luma from pixel b on, Cb and Cr from pair b / 2 on.
-    static void split(const int16_t* line, int32_t b, int32_t count, int16_t* y, int16_t* u, int16_t* v)
-    {
-        const int16_t* in = line + 2 * b;
-        // Per 128-bit lane Y0 Cb0 Y1 Cr0 Y2 Cb1 Y3 Cr1 -> Y0 Y1 Y2 Y3 Cb0 Cb1 Cr0 Cr1.
-        const __m256i lane = _mm256_setr_epi8(0, 1, 4, 5, 8, 9, 12, 13, 2, 3, 10, 11, 6, 7, 14, 15, 0, 1, 4, 5, 8, 9,
-                                              12, 13, 2, 3, 10, 11, 6, 7, 14, 15);
-        const __m256i chroma = _mm256_setr_epi32(0, 4, 2, 6, 1, 5, 3, 7);
-        int32_t k = 0;
-        for (; k + 16 <= count; k += 16) {
-            const __m256i a = _mm256_shuffle_epi8(_mm256_loadu_si256(reinterpret_cast<const __m256i*>(in + 2 * k)), lane);
-            const __m256i b2 =
-                _mm256_shuffle_epi8(_mm256_loadu_si256(reinterpret_cast<const __m256i*>(in + 2 * k + 16)), lane);
-            _mm256_storeu_si256(reinterpret_cast<__m256i*>(y + k),
-                                _mm256_permute4x64_epi64(_mm256_unpacklo_epi64(a, b2), 0xD8));
-            const __m256i uv = _mm256_permutevar8x32_epi32(_mm256_unpackhi_epi64(a, b2), chroma);
-            _mm_storeu_si128(reinterpret_cast<__m128i*>(u + k / 2), _mm256_castsi256_si128(uv));
-            _mm_storeu_si128(reinterpret_cast<__m128i*>(v + k / 2), _mm256_extracti128_si256(uv, 1));
-        }
-        for (; k < count; k += 2) {
-            y[k] = in[2 * k];
-            u[k / 2] = in[2 * k + 1];
-            y[k + 1] = in[2 * k + 2];
-            v[k / 2] = in[2 * k + 3];
-        }
-    }
-
     // Runs of whole pairs with the line split into planes a chunk at a time:
     // a pair's two luma windows and its Cb and Cr windows are then 8-element
     // chunks of contiguous samples, two multiply-adds of 256 bits for up to
@@ -413,7 +415,7 @@ struct BankSamplerV {
             const int32_t luma_end = i_last - T + 8 * kChunks;
             const int32_t chroma_end = 2 * ((i_last >> 1) - T + 8 * kChunks);
             const int32_t e = luma_end > chroma_end ? luma_end + (luma_end & 1) : chroma_end;
-            split(line, b, e - b, Y, U, V);
+            split_422(line, b, e - b, Y, U, V);
 
             const __m256i base_y = _mm256_set1_epi32(T + b), base_c = _mm256_set1_epi32(T + b / 2);
             for (int32_t k = 0; k < m; k += 4, d += 16) {
@@ -856,13 +858,183 @@ struct AreaSamplerV : AreaSampler<Units> {
     }
 #endif
 
+#if defined(LORVEX_ISA_AVX2)
+    // The first sample q and the widths n0, n1, n2 that spans [U, U + span)
+    // take of samples q, q + 1, q + 2 of a walk whose samples are W wide
+    // (U from the start of the walk's current sample; span <= 2 W).
+    struct Widths {
+        __m256i q, n0, n1, n2;
+    };
+    static Widths widths(__m256i U, int32_t W, int32_t span)
+    {
+        const __m256d Wd = _mm256_set1_pd(double(W));
+        const __m128i q_lo = _mm256_cvttpd_epi32(_mm256_div_pd(_mm256_cvtepi32_pd(_mm256_castsi256_si128(U)), Wd));
+        const __m128i q_hi = _mm256_cvttpd_epi32(_mm256_div_pd(_mm256_cvtepi32_pd(_mm256_extracti128_si256(U, 1)), Wd));
+        const __m256i q = _mm256_setr_m128i(q_lo, q_hi), w = _mm256_set1_epi32(W), zero = _mm256_setzero_si256();
+        const __m256i e0 = _mm256_add_epi32(_mm256_mullo_epi32(q, w), w), e1 = _mm256_add_epi32(e0, w);
+        const __m256i end = _mm256_add_epi32(U, _mm256_set1_epi32(span));
+        return {q, _mm256_sub_epi32(_mm256_min_epi32(e0, end), U),
+                _mm256_max_epi32(_mm256_sub_epi32(_mm256_min_epi32(e1, end), e0), zero),
+                _mm256_max_epi32(_mm256_sub_epi32(end, e1), zero)};
+    }
+
+    // The weighted sum of samples q, q + 1, q + 2 of a plane, each lane from
+    // base[lane] (a 32-bit read gives a sample and the next).
+    static __m256i weigh3(const int16_t* base, __m256i index, const Widths& v)
+    {
+        const __m256i g = _mm256_i32gather_epi32(reinterpret_cast<const int*>(base), _mm256_add_epi32(index, v.q), 2);
+        const __m256i h = _mm256_i32gather_epi32(reinterpret_cast<const int*>(base),
+                                                 _mm256_add_epi32(_mm256_add_epi32(index, v.q), _mm256_set1_epi32(2)), 2);
+        const __m256i s0 = _mm256_srai_epi32(_mm256_slli_epi32(g, 16), 16), s1 = _mm256_srai_epi32(g, 16);
+        const __m256i s2 = _mm256_srai_epi32(_mm256_slli_epi32(h, 16), 16);
+        return _mm256_add_epi32(_mm256_add_epi32(_mm256_mullo_epi32(s0, v.n0), _mm256_mullo_epi32(s1, v.n1)),
+                                _mm256_mullo_epi32(s2, v.n2));
+    }
+
+    // 4:2:2 at reductions up to 2, in closed form as the RGBQ run, with the
+    // line split into planes a chunk at a time. Luma spans of 0x10000 over
+    // samples w wide, chroma spans of 0x20000 over samples 2w wide, each by
+    // its own walk. A luma sum fits 32 bits for any samples; a chroma sum
+    // (widths adding up to 0x20000) when the chunk's chroma stays within
+    // +-2^14, as every picture's does - a chunk beyond takes the scalar walk.
+    // Four pairs at a time; returns the pairs drawn.
+    template <bool clamp, bool full>
+    int32_t pair_area_run(const MapContext& c, typename Dst::sample* d, int32_t n)
+    {
+        using S = typename Dst::sample;
+        constexpr int cs = Units::colour_shift;
+        constexpr int kCap = 1024;
+        const int32_t w = this->w, w2 = 2 * w;
+        if (w < 0x8000 || this->r <= 0 || this->r > w || this->r2 <= 0 || this->r2 > w2 || n < 4) return 0;
+        alignas(32) int16_t planes[2 * kCap + 64];
+        int16_t* const Y = planes;
+        int16_t* const U = planes + kCap + 16;
+        int16_t* const V = planes + kCap + kCap / 2 + 32;
+        const __m256i lanes = _mm256_slli_epi32(_mm256_setr_epi32(0, 1, 2, 3, 4, 5, 6, 7), 16);
+        const __m256i lanes2 = _mm256_slli_epi32(_mm256_setr_epi32(0, 1, 2, 3, 0, 1, 2, 3), 17);
+        const __m256i top = _mm256_set1_epi32(Dst::max), zero = _mm256_setzero_si256();
+        const __m256i low = _mm256_set1_epi32(sizeof(S) == 1 ? 0xFF : 0xFFFF);
+        const int32_t L = c.level;
+        const __m256i lv = _mm256_set1_epi32(L), inv = _mm256_set1_epi32(4096 - L), half = _mm256_set1_epi32(2048);
+        const __m256i chroma_order = _mm256_setr_epi32(0, 4, 1, 5, 2, 6, 3, 7);
+        // Pairs per chunk, in fours: 2m luma spans reach at most 4m + 3 samples.
+        constexpr int32_t kPerChunk = ((kCap - 16) / 4) & ~3;
+        int32_t done = 0;
+        while (n - done >= 4) {
+            const int32_t m = std::min((n - done) & ~3, kPerChunk);
+            const int32_t u0 = w - this->r, v0 = w2 - this->r2;
+            const int32_t p = this->p, p2 = this->p2;
+            const int32_t y_last = p + (u0 + 2 * m * 0x10000) / w + 3;
+            const int32_t c_last = p2 + (v0 + m * 0x20000) / w2 + 3;
+            const int32_t b = std::min(p & ~1, 2 * p2);
+            int32_t e = std::max(y_last, 2 * c_last + 2);
+            e += e & 1;
+            if (e - b > kCap) break;
+            split_422(this->line, b, e - b, Y, U, V);
+            // The chroma sums fit 32 bits for samples within +-2^14.
+            __m256i lo = _mm256_set1_epi16(-16384), hi = _mm256_set1_epi16(16383), bad = _mm256_setzero_si256();
+            const int32_t pairs_split = (e - b) / 2;
+            int32_t k = 0;
+            for (; k + 16 <= pairs_split; k += 16) {
+                const __m256i a = _mm256_loadu_si256(reinterpret_cast<const __m256i*>(U + k));
+                const __m256i z = _mm256_loadu_si256(reinterpret_cast<const __m256i*>(V + k));
+                bad = _mm256_or_si256(bad, _mm256_or_si256(_mm256_or_si256(_mm256_cmpgt_epi16(lo, a), _mm256_cmpgt_epi16(a, hi)),
+                                                           _mm256_or_si256(_mm256_cmpgt_epi16(lo, z), _mm256_cmpgt_epi16(z, hi))));
+            }
+            bool outside = !_mm256_testz_si256(bad, bad);
+            for (; k < pairs_split; ++k) outside |= U[k] < -16384 || U[k] > 16383 || V[k] < -16384 || V[k] > 16383;
+            if (outside) break;
+            const int16_t* ybase = Y + (p - b);
+            const int16_t* cbase = U + (p2 - b / 2);
+            const __m256i cindex = _mm256_setr_epi32(0, 0, 0, 0, int32_t(V - U), int32_t(V - U), int32_t(V - U), int32_t(V - U));
+            for (k = 0; k < m; k += 4, d += 16) {
+                const Widths yv = widths(_mm256_add_epi32(_mm256_set1_epi32(u0 + 2 * k * 0x10000), lanes), w, 0x10000);
+                const Widths cv = widths(_mm256_add_epi32(_mm256_set1_epi32(v0 + k * 0x20000), lanes2), w2, 0x20000);
+                const __m256i ys = weigh3(ybase, zero, yv);
+                const __m256i ch = weigh3(cbase, cindex, cv);
+                // Luma (x + 2^(15 + cs)) >> (16 + cs), chroma (x + 2^(16 + cs)) >> (17 + cs).
+                const __m256i Yv = _mm256_srai_epi32(_mm256_add_epi32(_mm256_srai_epi32(ys, cs), _mm256_set1_epi32(1 << 15)), 16);
+                const __m256i Cv = _mm256_permutevar8x32_epi32(
+                    _mm256_srai_epi32(_mm256_add_epi32(_mm256_srai_epi32(ch, cs), _mm256_set1_epi32(1 << 16)), 17),
+                    chroma_order);
+                // [pair 0 | pair 2] and [pair 1 | pair 3], each Y0 Cb Y1 Cr.
+                __m256i v[2] = {_mm256_unpacklo_epi32(Yv, Cv), _mm256_unpackhi_epi32(Yv, Cv)};
+                __m256i D[2];
+                if constexpr (!full) {
+                    const __m256i d01 = sizeof(S) == 1 ? _mm256_cvtepu8_epi32(_mm_loadl_epi64(reinterpret_cast<const __m128i*>(d)))
+                                                       : _mm256_cvtepu16_epi32(_mm_loadu_si128(reinterpret_cast<const __m128i*>(d)));
+                    const __m256i d23 =
+                        sizeof(S) == 1 ? _mm256_cvtepu8_epi32(_mm_loadl_epi64(reinterpret_cast<const __m128i*>(d + 8)))
+                                       : _mm256_cvtepu16_epi32(_mm_loadu_si128(reinterpret_cast<const __m128i*>(d + 8)));
+                    D[0] = _mm256_permute2x128_si256(d01, d23, 0x20);
+                    D[1] = _mm256_permute2x128_si256(d01, d23, 0x31);
+                }
+                for (int h = 0; h < 2; ++h) {
+                    if constexpr (clamp) v[h] = _mm256_min_epi32(_mm256_max_epi32(v[h], zero), top);
+                    if constexpr (!full)
+                        v[h] = _mm256_srai_epi32(
+                            _mm256_add_epi32(_mm256_add_epi32(_mm256_mullo_epi32(D[h], inv), _mm256_mullo_epi32(v[h], lv)),
+                                             half),
+                            12);
+                    v[h] = _mm256_and_si256(v[h], low);  // the low bits, as the scalar rule stores them
+                }
+                // [pair 0, pair 1 | pair 2, pair 3] in 16 bits.
+                const __m256i w16 = _mm256_packus_epi32(v[0], v[1]);
+                if constexpr (sizeof(S) == 1)
+                    _mm_storeu_si128(reinterpret_cast<__m128i*>(d),
+                                     _mm_packus_epi16(_mm256_castsi256_si128(w16), _mm256_extracti128_si256(w16, 1)));
+                else
+                    _mm256_storeu_si256(reinterpret_cast<__m256i*>(d), w16);
+            }
+            // Both walks past the chunk.
+            const int32_t u_end = u0 + 2 * m * 0x10000, v_end = v0 + m * 0x20000;
+            this->p += u_end / w;
+            this->r = w - u_end % w;
+            this->p2 += v_end / w2;
+            this->r2 = w2 - v_end % w2;
+            done += m;
+        }
+        return done;
+    }
+#endif
+
     void generic_run(const MapContext& c, typename Dst::sample* d, int32_t n, bool clamp)
     {
         using T = typename Dst::sample;
         constexpr int cs = Units::colour_shift;
         constexpr int64_t b16 = int64_t(1) << (15 + cs), b17 = int64_t(1) << (16 + cs);
         const int32_t L = c.level;
+        const auto put = [&](T* at, int64_t acc, int shift) { put_whole<Dst>(at, int32_t(acc >> shift), clamp, L); };
+        const int32_t w = this->w;
+        const auto one_pair = [&] {
+            int64_t y0[1] = {b16}, y1[1] = {b16}, ch[2] = {b17, b17};
+            consume<1, 2, 1>(this->line, this->p, this->r, w, 0x10000, y0);
+            consume<2, 4, 2>(this->line + 1, this->p2, this->r2, 2 * w, 0x20000, ch);
+            consume<1, 2, 1>(this->line, this->p, this->r, w, 0x10000, y1);
+            put(d, y0[0], 16 + cs);
+            put(d + 1, ch[0], 17 + cs);
+            put(d + 2, y1[0], 16 + cs);
+            put(d + 3, ch[1], 17 + cs);
+            d += 4;  // a pair's four samples
+        };
 #if defined(LORVEX_ISA_AVX2)
+        if constexpr (Dst::pairs) {
+            // A pair or two by the walk itself bring a chroma walk that starts
+            // with a longer first sample in step; then the closed form.
+            for (int tries = 0; tries < 4 && n >= 4 && w >= 0x8000; ++tries) {
+                if (this->r > 0 && this->r <= w && this->r2 > 0 && this->r2 <= 2 * w) {
+                    const int32_t done = c.level == 4096 ? (clamp ? pair_area_run<true, true>(c, d, n)
+                                                                  : pair_area_run<false, true>(c, d, n))
+                                                         : (clamp ? pair_area_run<true, false>(c, d, n)
+                                                                  : pair_area_run<false, false>(c, d, n));
+                    d += 4 * done;
+                    n -= done;
+                    break;
+                }
+                one_pair();
+                --n;
+            }
+        }
         if constexpr (!Dst::pairs && Dst::colour_samples == 4) {
             const int32_t pixels = 2 * n;
             const int32_t done = c.level == 4096 ? (clamp ? quad_area_run<true, true>(c, d, pixels)
@@ -873,26 +1045,17 @@ struct AreaSamplerV : AreaSampler<Units> {
             n -= done / 2;
         }
 #endif
-        const auto put = [&](T* at, int64_t acc, int shift) { put_whole<Dst>(at, int32_t(acc >> shift), clamp, L); };
-        const int32_t w = this->w;
         for (int32_t k = 0; k < n; ++k) {
             if constexpr (Dst::pairs) {
-                int64_t y0[1] = {b16}, y1[1] = {b16}, ch[2] = {b17, b17};
-                consume<1, 2, 1>(this->line, this->p, this->r, w, 0x10000, y0);
-                consume<2, 4, 2>(this->line + 1, this->p2, this->r2, 2 * w, 0x20000, ch);
-                consume<1, 2, 1>(this->line, this->p, this->r, w, 0x10000, y1);
-                put(d, y0[0], 16 + cs);
-                put(d + 1, ch[0], 17 + cs);
-                put(d + 2, y1[0], 16 + cs);
-                put(d + 3, ch[1], 17 + cs);
+                one_pair();
             } else {
                 for (int half = 0; half < 2; ++half) {
                     int32_t v[4];
                     consume_quad(this->line, this->p, this->r, w, b16, 16 + cs, v);
                     for (int e = 0; e < 4; ++e) put_whole<Dst>(d + 4 * half + e, v[e], clamp, L);
                 }
+                d += 8;
             }
-            d += Dst::pairs ? 2 * Dst::bytes_per_pixel / sizeof(T) : 8;
         }
     }
 };
