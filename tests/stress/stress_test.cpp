@@ -46,6 +46,7 @@
 #include <vector>
 
 #include "lorvex.h"
+#include "shared/simd.h"
 
 namespace {
 
@@ -764,6 +765,49 @@ TEST(Stress, RandomLegalCallsTouchOnlyWhatTheyMay)
     // Most calls that may draw do draw: a library that refused everything
     // would pass every check above.
     EXPECT_GT(cov.drew, cov.drawable * 3 / 4) << cov.drew << " of " << cov.drawable << " drew";
+}
+
+// The destination planes after one call of a case, colour then alpha.
+std::vector<uint8_t> draw_case(const Case& c)
+{
+    Rng fill{c.fill};
+    Planes dst, src;
+    make_planes(c.dst, false, c.guard_before, fill, dst);
+    make_planes(c.src, true, c.guard_before, fill, src);
+    map_rectangle(&dst.surface, c.x0, c.y0, c.x1, c.y1, &src.surface, c.sx0, c.sy0, c.sx1, c.sy1,
+                  int32_t(c.flags), c.line_phase, c.line_period);
+    std::vector<uint8_t> out;
+    if (dst.colour) out.insert(out.end(), dst.colour.block->data(), dst.colour.block->data() + dst.colour.block->size());
+    if (dst.alpha) out.insert(out.end(), dst.alpha.block->data(), dst.alpha.block->data() + dst.alpha.block->size());
+    return out;
+}
+
+// Whole calls at every vector level the processor has draw the bytes of the
+// scalar kernels, over the same random legal calls.
+TEST(Stress, VectorLevelsDrawTheScalarBytes)
+{
+    using lorvex::detected_simd_level, lorvex::force_simd_level, lorvex::SimdLevel;
+    std::vector<SimdLevel> levels;
+    for (SimdLevel l : {SimdLevel::sse41, SimdLevel::avx2})
+        if (int(l) <= int(detected_simd_level())) levels.push_back(l);
+    if (levels.empty()) GTEST_SKIP() << "no vector level on this processor";
+    FaultReporter reporter;
+    int failures = 0;
+    for (int i = 0; i < 2500 && failures < 5; ++i) {
+        const Case c = make_case(i);
+        const std::string text = describe(i, c);
+        FaultReporter::set(text);
+        force_simd_level(SimdLevel::scalar);
+        const std::vector<uint8_t> scalar = draw_case(c);
+        for (SimdLevel level : levels) {
+            force_simd_level(level);
+            if (draw_case(c) != scalar) {
+                ADD_FAILURE() << "level " << int(level) << " differs from the scalar kernels\n" << text;
+                ++failures;
+            }
+        }
+    }
+    force_simd_level(detected_simd_level());
 }
 
 TEST(Stress, Regressions)
