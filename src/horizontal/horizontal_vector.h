@@ -157,19 +157,33 @@ struct BankSamplerV {
                 }
                 continue;  // the RGBQ pixel samples from these taps alone
             }
-            for (int e = 0; e < kLumaRegs * L; ++e) cy[p][e] = 0;
             if constexpr (Dst::pairs) {
-                for (int k = 0; k < taps; ++k) cy[p][2 * k] = row[7 - T + k];
-                const int16_t* crow = c.hbank_c + p * 16;
-                for (int e = 0; e < kChromaRegs * L; ++e) cc[p][e] = 0;
-                for (int k = 0; k < taps; ++k) cc[p][4 * k + 1] = cc[p][4 * k + 3] = crow[7 - T + k];
+                __m128i y[2], ch[2];
+                taps_of(row, y);
+                taps_of(c.hbank_c + p * 16, ch);
+                const __m128i zero = _mm_setzero_si128();
+                const auto part = [&](const __m128i (&t)[2], int i) { return i < 2 ? t[i] : zero; };
+                // Luma taps at the even elements: eight elements hold four taps.
+                for (int j = 0; j < kLumaRegs * L / 8; ++j) {
+                    const __m128i t = part(y, j / 2);
+                    _mm_store_si128(reinterpret_cast<__m128i*>(cy[p] + 8 * j),
+                                    j % 2 ? _mm_unpackhi_epi16(t, zero) : _mm_unpacklo_epi16(t, zero));
+                }
+                // Chroma taps on the Cb and Cr elements: eight elements hold two taps.
+                for (int j = 0; j < kChromaRegs * L / 8; ++j) {
+                    const __m128i t = part(ch, j / 4);
+                    const __m128i u = j % 4 < 2 ? _mm_unpacklo_epi16(zero, t) : _mm_unpackhi_epi16(zero, t);
+                    _mm_store_si128(reinterpret_cast<__m128i*>(cc[p] + 8 * j),
+                                    j % 2 ? _mm_unpackhi_epi32(u, u) : _mm_unpacklo_epi32(u, u));
+                }
                 if constexpr (kPlanar) {
-                    for (int k = 0; k < kChunks * 8; ++k) {
-                        py[p][k] = k < taps ? row[7 - T + k] : 0;
-                        pc[p][k] = k < taps ? crow[7 - T + k] : 0;
+                    for (int j = 0; j < kChunks; ++j) {
+                        _mm_store_si128(reinterpret_cast<__m128i*>(py[p] + 8 * j), y[j]);
+                        _mm_store_si128(reinterpret_cast<__m128i*>(pc[p] + 8 * j), ch[j]);
                     }
                 }
             } else {
+                for (int e = 0; e < kLumaRegs * L; ++e) cy[p][e] = 0;
                 for (int e = 0; e < kLumaRegs * L; ++e) cy2[p][e] = 0;
                 for (int k = 0; k < taps; ++k) {
                     cy[p][4 * k] = cy[p][4 * k + 2] = row[7 - T + k];
@@ -181,6 +195,21 @@ struct BankSamplerV {
                 for (int k = 0; k < taps; ++k) ca[p][k] = row[7 - T + k];
             }
         }
+    }
+
+    // The taps k = 0 .. 2T + 1 of a bank row (row[7 - T + k]) in two
+    // registers of eight, zero beyond the last.
+    static void taps_of(const int16_t* row, __m128i (&t)[2])
+    {
+        const __m128i a = _mm_loadu_si128(reinterpret_cast<const __m128i*>(row));
+        const __m128i b = _mm_loadu_si128(reinterpret_cast<const __m128i*>(row + 8));
+        alignas(16) static constexpr int16_t keep[16] = {
+            0 < taps ? -1 : 0,  1 < taps ? -1 : 0,  2 < taps ? -1 : 0,  3 < taps ? -1 : 0,
+            4 < taps ? -1 : 0,  5 < taps ? -1 : 0,  6 < taps ? -1 : 0,  7 < taps ? -1 : 0,
+            8 < taps ? -1 : 0,  9 < taps ? -1 : 0,  10 < taps ? -1 : 0, 11 < taps ? -1 : 0,
+            12 < taps ? -1 : 0, 13 < taps ? -1 : 0, 14 < taps ? -1 : 0, 15 < taps ? -1 : 0};
+        t[0] = _mm_and_si128(_mm_alignr_epi8(b, a, 2 * (7 - T)), _mm_load_si128(reinterpret_cast<const __m128i*>(keep)));
+        t[1] = _mm_and_si128(_mm_srli_si128(b, 2 * (7 - T)), _mm_load_si128(reinterpret_cast<const __m128i*>(keep + 8)));
     }
 
     template <int N>
