@@ -14,6 +14,7 @@
 #pragma once
 
 #include <algorithm>
+#include <type_traits>
 
 #include "horizontal/compose_plain.h"
 #include "horizontal/sample_area.h"
@@ -37,6 +38,18 @@ inline __m128i fold128(__m256i v)
 
 // One sample of a whole pixel by the plain rule: limited when the call
 // clamps, mixed at a level other than 4096, stored with its low bits.
+// Calls run(integral_constant<bool, clamp>, integral_constant<bool, full>)
+// with the two tests of a whole-pixel run made once, outside its loop: whether
+// samples are limited and whether the level is 4096.
+template <class Run>
+inline auto with_run_flags(bool clamp, int32_t level, Run&& run)
+{
+    using Yes = std::true_type;
+    using No = std::false_type;
+    if (level == 4096) return clamp ? run(Yes{}, Yes{}) : run(No{}, Yes{});
+    return clamp ? run(Yes{}, No{}) : run(No{}, No{});
+}
+
 template <class Dst>
 inline void put_whole(typename Dst::sample* at, int32_t v, bool clamp, int32_t level)
 {
@@ -398,10 +411,7 @@ struct BankSamplerV {
     // eight taps, and two pairs reduce together to the order in memory.
     void planar_run(const MapContext& c, typename Dst::sample* d, int32_t n, bool clamp)
     {
-        if (c.level == 4096)
-            clamp ? planar_run<true, true>(c, d, n) : planar_run<false, true>(c, d, n);
-        else
-            clamp ? planar_run<true, false>(c, d, n) : planar_run<false, false>(c, d, n);
+        with_run_flags(clamp, c.level, [&](auto limit, auto full) { planar_run<limit(), full()>(c, d, n); });
     }
 
     template <bool clamp, bool full>
@@ -545,10 +555,7 @@ struct BankSamplerV {
 
     void quad_run(const MapContext& c, typename Dst::sample* d, int32_t n, bool clamp)
     {
-        if (c.level == 4096)
-            clamp ? quad_run<true, true>(c, d, n) : quad_run<false, true>(c, d, n);
-        else
-            clamp ? quad_run<true, false>(c, d, n) : quad_run<false, false>(c, d, n);
+        with_run_flags(clamp, c.level, [&](auto limit, auto full) { quad_run<limit(), full()>(c, d, n); });
     }
 
     // Eight RGBQ pixels at a time: their offsets computed together, two
@@ -837,9 +844,7 @@ struct AreaSamplerV : AreaSampler<Units> {
         constexpr int cs = Units::colour_shift;
         const int32_t w = this->w;
         if (w < 0x8000 || this->r <= 0 || this->r > w || pixels < 8) return 0;
-        const __m256i round = _mm256_set1_epi32(1 << 15), zero = _mm256_setzero_si256();
-        const __m256i W = _mm256_set1_epi32(w), span = _mm256_set1_epi32(0x10000);
-        const __m256d Wd = _mm256_set1_pd(double(w));
+        const __m256i round = _mm256_set1_epi32(1 << 15);
         const __m256i lanes = _mm256_slli_epi32(_mm256_setr_epi32(0, 1, 2, 3, 4, 5, 6, 7), 16);
         const int16_t* base = this->line + 4 * this->p;
         alignas(32) int32_t at[8];
@@ -847,16 +852,9 @@ struct AreaSamplerV : AreaSampler<Units> {
         int32_t k = 0;
         for (; k + 8 <= pixels; k += 8, d += 32, u0 += 8 * 0x10000) {
             const __m256i U = _mm256_add_epi32(_mm256_set1_epi32(u0), lanes);
-            const __m128i q_lo = _mm256_cvttpd_epi32(_mm256_div_pd(_mm256_cvtepi32_pd(_mm256_castsi256_si128(U)), Wd));
-            const __m128i q_hi = _mm256_cvttpd_epi32(_mm256_div_pd(_mm256_cvtepi32_pd(_mm256_extracti128_si256(U, 1)), Wd));
-            const __m256i q = _mm256_setr_m128i(q_lo, q_hi);
-            const __m256i e0 = _mm256_add_epi32(_mm256_mullo_epi32(q, W), W), e1 = _mm256_add_epi32(e0, W);
-            const __m256i end = _mm256_add_epi32(U, span);
-            const __m256i n0 = _mm256_sub_epi32(_mm256_min_epi32(e0, end), U);
-            const __m256i n1 = _mm256_max_epi32(_mm256_sub_epi32(_mm256_min_epi32(e1, end), e0), zero);
-            const __m256i n2 = _mm256_max_epi32(_mm256_sub_epi32(end, e1), zero);
-            _mm256_store_si256(reinterpret_cast<__m256i*>(at), _mm256_slli_epi32(q, 2));
-            __m256i v[4];
+            const Widths v = widths(U, w, 0x10000);
+            _mm256_store_si256(reinterpret_cast<__m256i*>(at), _mm256_slli_epi32(v.q, 2));
+            __m256i out[4];
             for (int m = 0; m < 4; ++m) {
                 const int16_t* a = base + at[2 * m];
                 const int16_t* b = base + at[2 * m + 1];
@@ -872,13 +870,13 @@ struct AreaSamplerV : AreaSampler<Units> {
                 const __m256i s1 = _mm256_srai_epi32(_mm256_unpackhi_epi16(two, two), 16);
                 const __m256i s2 = _mm256_cvtepi16_epi32(third);
                 const __m256i x = _mm256_add_epi32(
-                    _mm256_add_epi32(_mm256_mullo_epi32(s0, _mm256_permutevar8x32_epi32(n0, pick)),
-                                     _mm256_mullo_epi32(s1, _mm256_permutevar8x32_epi32(n1, pick))),
-                    _mm256_mullo_epi32(s2, _mm256_permutevar8x32_epi32(n2, pick)));
+                    _mm256_add_epi32(_mm256_mullo_epi32(s0, _mm256_permutevar8x32_epi32(v.n0, pick)),
+                                     _mm256_mullo_epi32(s1, _mm256_permutevar8x32_epi32(v.n1, pick))),
+                    _mm256_mullo_epi32(s2, _mm256_permutevar8x32_epi32(v.n2, pick)));
                 const __m256i y = _mm256_srai_epi32(_mm256_add_epi32(_mm256_srai_epi32(x, cs), round), 16);
-                v[m] = whole_rgbq2<clamp, full>(y, d + 8 * m, c.level);
+                out[m] = whole_rgbq2<clamp, full>(y, d + 8 * m, c.level);
             }
-            store_rgbq8(d, v);
+            store_rgbq8(d, out);
         }
         // The walk after the run: u0 is where the next pixel begins.
         this->p += u0 / w;
@@ -1052,10 +1050,8 @@ struct AreaSamplerV : AreaSampler<Units> {
             // with a longer first sample in step; then the closed form.
             for (int tries = 0; tries < 4 && n >= 4 && w >= 0x8000; ++tries) {
                 if (this->r > 0 && this->r <= w && this->r2 > 0 && this->r2 <= 2 * w) {
-                    const int32_t done = c.level == 4096 ? (clamp ? pair_area_run<true, true>(c, d, n)
-                                                                  : pair_area_run<false, true>(c, d, n))
-                                                         : (clamp ? pair_area_run<true, false>(c, d, n)
-                                                                  : pair_area_run<false, false>(c, d, n));
+                    const int32_t done = with_run_flags(
+                        clamp, L, [&](auto limit, auto full) { return pair_area_run<limit(), full()>(c, d, n); });
                     d += 4 * done;
                     n -= done;
                     break;
@@ -1066,10 +1062,8 @@ struct AreaSamplerV : AreaSampler<Units> {
         }
         if constexpr (!Dst::pairs && Dst::colour_samples == 4) {
             const int32_t pixels = 2 * n;
-            const int32_t done = c.level == 4096 ? (clamp ? quad_area_run<true, true>(c, d, pixels)
-                                                          : quad_area_run<false, true>(c, d, pixels))
-                                                 : (clamp ? quad_area_run<true, false>(c, d, pixels)
-                                                          : quad_area_run<false, false>(c, d, pixels));
+            const int32_t done = with_run_flags(
+                clamp, L, [&](auto limit, auto full) { return quad_area_run<limit(), full()>(c, d, pixels); });
             d += 4 * done;
             n -= done / 2;
         }
@@ -1326,8 +1320,8 @@ struct LinearSamplerV : LinearSampler<Units> {
         using T = typename Dst::sample;
         constexpr int cs = Units::colour_shift;
 #if defined(LORVEX_ISA_AVX2)
-        const int32_t done = c.level == 4096 ? (clamp ? quad_run8<true, true>(c, d, n) : quad_run8<false, true>(c, d, n))
-                                             : (clamp ? quad_run8<true, false>(c, d, n) : quad_run8<false, false>(c, d, n));
+        const int32_t done =
+            with_run_flags(clamp, c.level, [&](auto limit, auto full) { return quad_run8<limit(), full()>(c, d, n); });
         d += 4 * done;
         n -= done;
 #endif
