@@ -845,14 +845,13 @@ struct AreaSamplerV : AreaSampler<Units> {
         const int32_t w = this->w;
         if (w < 0x8000 || this->r <= 0 || this->r > w || pixels < 8) return 0;
         const __m256i round = _mm256_set1_epi32(1 << 15);
-        const __m256i lanes = _mm256_slli_epi32(_mm256_setr_epi32(0, 1, 2, 3, 4, 5, 6, 7), 16);
         const int16_t* base = this->line + 4 * this->p;
         alignas(32) int32_t at[8];
         int32_t u0 = w - this->r;
+        Spans spans(u0, 0x10000, w, 0x10000, {0, 1, 2, 3, 4, 5, 6, 7});
         int32_t k = 0;
-        for (; k + 8 <= pixels; k += 8, d += 32, u0 += 8 * 0x10000) {
-            const __m256i U = _mm256_add_epi32(_mm256_set1_epi32(u0), lanes);
-            const Widths v = widths(U, w, 0x10000);
+        for (; k + 8 <= pixels; k += 8, d += 32, u0 += 8 * 0x10000, spans.next()) {
+            const Widths v = spans.widths();
             _mm256_store_si256(reinterpret_cast<__m256i*>(at), _mm256_slli_epi32(v.q, 2));
             __m256i out[4];
             for (int m = 0; m < 4; ++m) {
@@ -892,18 +891,43 @@ struct AreaSamplerV : AreaSampler<Units> {
     struct Widths {
         __m256i q, n0, n1, n2;
     };
-    static Widths widths(__m256i U, int32_t W, int32_t span)
-    {
-        const __m256d Wd = _mm256_set1_pd(double(W));
-        const __m128i q_lo = _mm256_cvttpd_epi32(_mm256_div_pd(_mm256_cvtepi32_pd(_mm256_castsi256_si128(U)), Wd));
-        const __m128i q_hi = _mm256_cvttpd_epi32(_mm256_div_pd(_mm256_cvtepi32_pd(_mm256_extracti128_si256(U, 1)), Wd));
-        const __m256i q = _mm256_setr_m128i(q_lo, q_hi), w = _mm256_set1_epi32(W), zero = _mm256_setzero_si256();
-        const __m256i e0 = _mm256_add_epi32(_mm256_mullo_epi32(q, w), w), e1 = _mm256_add_epi32(e0, w);
-        const __m256i end = _mm256_add_epi32(U, _mm256_set1_epi32(span));
-        return {q, _mm256_sub_epi32(_mm256_min_epi32(e0, end), U),
-                _mm256_max_epi32(_mm256_sub_epi32(_mm256_min_epi32(e1, end), e0), zero),
-                _mm256_max_epi32(_mm256_sub_epi32(end, e1), zero)};
-    }
+    // Eight spans, lane j beginning at U0 + j step, moved on by eight spans
+    // a time. Each lane keeps its first sample q and where the span starts in
+    // it, rem = U - q W (0 <= rem < W), so that a move is an add and at most
+    // one carry: no division after the first eight.
+    struct Spans {
+        __m256i q, rem, W, W1, A, B;
+        int32_t span;
+        Spans(int32_t U0, int32_t step, int32_t W_, int32_t span_, const int32_t (&lane)[8]) : span(span_)
+        {
+            alignas(32) int32_t q0[8], r0[8];
+            for (int j = 0; j < 8; ++j) {
+                const int32_t u = U0 + lane[j] * step;
+                q0[j] = u / W_;
+                r0[j] = u % W_;
+            }
+            q = _mm256_load_si256(reinterpret_cast<const __m256i*>(q0));
+            rem = _mm256_load_si256(reinterpret_cast<const __m256i*>(r0));
+            W = _mm256_set1_epi32(W_);
+            W1 = _mm256_set1_epi32(W_ - 1);
+            A = _mm256_set1_epi32(8 * step / W_);
+            B = _mm256_set1_epi32(8 * step % W_);
+        }
+        Widths widths() const
+        {
+            const __m256i zero = _mm256_setzero_si256(), sv = _mm256_set1_epi32(span);
+            const __m256i e0 = _mm256_sub_epi32(W, rem), e1 = _mm256_add_epi32(e0, W);
+            return {q, _mm256_min_epi32(e0, sv), _mm256_max_epi32(_mm256_sub_epi32(_mm256_min_epi32(e1, sv), e0), zero),
+                    _mm256_max_epi32(_mm256_sub_epi32(sv, e1), zero)};
+        }
+        void next()
+        {
+            rem = _mm256_add_epi32(rem, B);
+            const __m256i carry = _mm256_cmpgt_epi32(rem, W1);
+            rem = _mm256_sub_epi32(rem, _mm256_and_si256(carry, W));
+            q = _mm256_sub_epi32(_mm256_add_epi32(q, A), carry);
+        }
+    };
 
     // The weighted sum of samples q, q + 1, q + 2 of a plane, each lane from
     // base[lane] (a 32-bit read gives a sample and the next).
@@ -937,8 +961,6 @@ struct AreaSamplerV : AreaSampler<Units> {
         int16_t* const Y = planes;
         int16_t* const U = planes + kCap + 16;
         int16_t* const V = planes + kCap + kCap / 2 + 32;
-        const __m256i lanes = _mm256_slli_epi32(_mm256_setr_epi32(0, 1, 2, 3, 4, 5, 6, 7), 16);
-        const __m256i lanes2 = _mm256_slli_epi32(_mm256_setr_epi32(0, 1, 2, 3, 0, 1, 2, 3), 17);
         const __m256i top = _mm256_set1_epi32(Dst::max), zero = _mm256_setzero_si256();
         const __m256i low = _mm256_set1_epi32(sizeof(S) == 1 ? 0xFF : 0xFFFF);
         const int32_t L = c.level;
@@ -974,9 +996,11 @@ struct AreaSamplerV : AreaSampler<Units> {
             const int16_t* ybase = Y + (p - b);
             const int16_t* cbase = U + (p2 - b / 2);
             const __m256i cindex = _mm256_setr_epi32(0, 0, 0, 0, int32_t(V - U), int32_t(V - U), int32_t(V - U), int32_t(V - U));
-            for (k = 0; k < m; k += 4, d += 16) {
-                const Widths yv = widths(_mm256_add_epi32(_mm256_set1_epi32(u0 + 2 * k * 0x10000), lanes), w, 0x10000);
-                const Widths cv = widths(_mm256_add_epi32(_mm256_set1_epi32(v0 + k * 0x20000), lanes2), w2, 0x20000);
+            Spans luma(u0, 0x10000, w, 0x10000, {0, 1, 2, 3, 4, 5, 6, 7});
+            Spans chroma(v0, 0x20000 / 2, w2, 0x20000, {0, 2, 4, 6, 0, 2, 4, 6});
+            for (k = 0; k < m; k += 4, d += 16, luma.next(), chroma.next()) {
+                const Widths yv = luma.widths();
+                const Widths cv = chroma.widths();
                 const __m256i ys = weigh3(ybase, zero, yv);
                 const __m256i ch = weigh3(cbase, cindex, cv);
                 // Luma (x + 2^(15 + cs)) >> (16 + cs), chroma (x + 2^(16 + cs)) >> (17 + cs).
