@@ -68,6 +68,7 @@ struct Fixed {
     int clamp = -1;         // -1: either
     bool full = false;      // level 4096, whole lines
     bool alpha_runs = false;// source alpha in runs of telling values
+    bool extremes = false;  // a few line elements anywhere in the 16-bit range
 };
 
 int compare_random_strip(const Table& t, std::mt19937& rng, const std::vector<SimdLevel>& levels, int max_pixels,
@@ -77,6 +78,9 @@ int compare_random_strip(const Table& t, std::mt19937& rng, const std::vector<Si
     const int T = slot >= 4 ? slot - 4 : 1;
     LineBuffer buffer;
     for (int16_t& v : buffer.storage) v = int16_t(int(rng() % 9000) - 400);
+    if (fixed.extremes)
+        for (int16_t& v : buffer.storage)
+            if (rng() % 500 == 0) v = int16_t(rng());
     MapContext c;
     c.line = buffer.line();
     c.line_a = c.line + 8192;
@@ -218,6 +222,29 @@ TEST(HorizontalLevels, VectorKernelsMatchScalarOnLongStrips)
             ASSERT_GE(n, 0);
             compared += n;
         }
+    EXPECT_GT(compared, 100);
+}
+
+// Runs that work in narrower lanes while the line's elements allow it check
+// them first: lines with a few elements anywhere in the 16-bit range take
+// their wide forms, and must draw the same bytes.
+TEST(HorizontalLevels, LinesWithExtremeElementsMatchScalar)
+{
+    const auto levels = vector_levels();
+    if (levels.empty()) GTEST_SKIP() << "no vector level on this processor";
+    std::mt19937 rng(1601);
+    int compared = 0;
+    for (const Table& t : kTables)
+        for (int slot = 2; slot <= 3; ++slot)
+            for (int iter = 0; iter < 6; ++iter) {
+                Fixed f;
+                f.slot = slot;
+                f.extremes = true;
+                f.full = iter % 2 == 0;
+                const int n = compare_random_strip(t, rng, levels, 2500, iter, f);
+                ASSERT_GE(n, 0);
+                compared += n;
+            }
     EXPECT_GT(compared, 100);
 }
 
