@@ -86,6 +86,64 @@ inline void split_422(const int16_t* line, int32_t b, int32_t count, int16_t* y,
     }
 }
 
+// Whether elements [from, to) of a line all lie within [lo, hi].
+inline bool within(const int16_t* line, int32_t from, int32_t to, int16_t lo, int16_t hi)
+{
+    __m256i mn = _mm256_set1_epi16(lo), mx = _mm256_set1_epi16(hi);
+    int32_t e = from;
+    for (; e + 32 <= to; e += 32) {
+        const __m256i x = _mm256_loadu_si256(reinterpret_cast<const __m256i*>(line + e));
+        const __m256i y = _mm256_loadu_si256(reinterpret_cast<const __m256i*>(line + e + 16));
+        mn = _mm256_min_epi16(mn, _mm256_min_epi16(x, y));
+        mx = _mm256_max_epi16(mx, _mm256_max_epi16(x, y));
+    }
+    const __m256i bad = _mm256_or_si256(_mm256_cmpgt_epi16(_mm256_set1_epi16(lo), mn),
+                                        _mm256_cmpgt_epi16(mx, _mm256_set1_epi16(hi)));
+    bool out = !_mm256_testz_si256(bad, bad);
+    for (; e < to; ++e) out |= line[e] < lo || line[e] > hi;
+    return !out;
+}
+
+// Four RGBQ pixels interpolated in 16-bit lanes as [0 1 | 2 3], pixel j
+// between the pixels at elements at[j] and at[j] + 4 with the fraction in F
+// (each pixel's f in its four lanes). With d = b - a, a (0x10000 - f) + b f
+// = a 2^16 + d f, and floor((a 2^16 + d f + 2^(15 + cs)) / 2^(16 + cs)) is
+// (a + floor(d f / 2^16) + 2^(cs - 1)) >> cs: the low half of d f is a
+// fraction below one that cannot carry into it. For the unsigned f,
+// floor(d f / 2^16) is the signed high product with f read as signed, plus
+// d where f's top bit is set. Every term fits 16 bits while the elements
+// stay within +-16383.
+template <int cs>
+inline __m256i lerp4_16(const int16_t* line, const int32_t* at, __m256i F)
+{
+    static_assert(cs >= 1 && cs <= 15);
+    const auto two = [&](int x, int y) {
+        return _mm256_inserti128_si256(
+            _mm256_castsi128_si256(_mm_loadu_si128(reinterpret_cast<const __m128i*>(line + at[x]))),
+            _mm_loadu_si128(reinterpret_cast<const __m128i*>(line + at[y])), 1);
+    };
+    const __m256i x = two(0, 2), y = two(1, 3);
+    const __m256i a = _mm256_unpacklo_epi64(x, y), b = _mm256_unpackhi_epi64(x, y);
+    const __m256i dv = _mm256_sub_epi16(b, a);
+    const __m256i high = _mm256_add_epi16(_mm256_mulhi_epi16(dv, F), _mm256_and_si256(dv, _mm256_srai_epi16(F, 15)));
+    return _mm256_srai_epi16(_mm256_add_epi16(_mm256_add_epi16(a, high), _mm256_set1_epi16(int16_t(1 << (cs - 1)))), cs);
+}
+
+// Spreads four of eight 32-bit lanes (the low four, or the high) over pairs
+// of lanes, [j j j+1 j+1 | ...]: with twice16, a pixel's value in its four
+// 16-bit lanes.
+inline __m256i spread4(__m256i v, int high)
+{
+    return _mm256_permutevar8x32_epi32(v, high ? _mm256_setr_epi32(4, 4, 5, 5, 6, 6, 7, 7)
+                                               : _mm256_setr_epi32(0, 0, 1, 1, 2, 2, 3, 3));
+}
+
+// The low half of each 32-bit lane in both of its 16-bit halves.
+inline __m256i twice16(__m256i v)
+{
+    return _mm256_or_si256(_mm256_and_si256(v, _mm256_set1_epi32(0xFFFF)), _mm256_slli_epi32(v, 16));
+}
+
 // The plain whole-pixel rule on two RGBQ pixels in 32-bit lanes: limited
 // when Clamp, mixed with the destination at `d` when not Full, the low
 // bits kept as the scalar rule stores them.
@@ -1240,13 +1298,74 @@ struct LinearSamplerV : LinearSampler<Units> {
     }
 #endif
 
+#if defined(LORVEX_ISA_AVX2)
+    // The general rule of alpha_run8 in 16-bit lanes, for lines whose colour
+    // elements stay within +-16383: S from lerp4_16, A in 32-bit lanes as
+    // before (it lies between two alpha elements, so it fits 16 bits),
+    // (D (16384 - A) + 8192) >> 14 as the rounding high product of 2 D and
+    // 16384 - A, which is the same floor (16384 - A may wrap only where A is
+    // below 1, whose pixels keep D). Stops before the first eight pixels with
+    // an alpha above 16384 (their division takes alpha_run8). Returns the
+    // pixels drawn, a multiple of eight.
+    template <bool clamp>
+    int32_t alpha_run16(typename Dst::sample* d, int32_t n)
+    {
+        constexpr int cs = Dst::buffer_shift;
+        const __m256i zero = _mm256_setzero_si256(), top = _mm256_set1_epi16(int16_t(Dst::max));
+        const __m256i steps = _mm256_mullo_epi32(_mm256_setr_epi32(0, 1, 2, 3, 4, 5, 6, 7), _mm256_set1_epi32(this->step));
+        int32_t p = this->pos;
+        alignas(32) int32_t at[8];
+        int32_t k = 0;
+        for (; k + 8 <= n; k += 8, d += 32) {
+            const __m256i P = _mm256_add_epi32(_mm256_set1_epi32(p), steps);
+            const __m256i i = _mm256_srai_epi32(P, 16), f = _mm256_and_si256(P, _mm256_set1_epi32(0xFFFF));
+            const __m256i g = _mm256_i32gather_epi32(reinterpret_cast<const int*>(this->line_a), i, 2);
+            const __m256i alpha =
+                lerp_lanes<0>(_mm256_srai_epi32(_mm256_slli_epi32(g, 16), 16), _mm256_srai_epi32(g, 16), f);
+            const __m256i over = _mm256_cmpgt_epi32(alpha, _mm256_set1_epi32(16384));
+            if (!_mm256_testz_si256(over, over)) break;
+            _mm256_store_si256(reinterpret_cast<__m256i*>(at), _mm256_slli_epi32(i, 2));
+            asm volatile("" : : "r"(at) : "memory");
+            p += 8 * this->step;
+            const __m256i f2 = twice16(f), a2 = twice16(alpha);
+            __m256i v[2];
+            for (int q = 0; q < 2; ++q) {
+                __m256i S = lerp4_16<cs>(this->line, at + 4 * q, spread4(f2, q));
+                if constexpr (clamp) S = _mm256_min_epi16(_mm256_max_epi16(S, zero), top);
+                const __m256i A = spread4(a2, q);
+                const __m256i D = _mm256_cvtepu8_epi16(_mm_loadu_si128(reinterpret_cast<const __m128i*>(d + 16 * q)));
+                const __m256i t = _mm256_mulhrs_epi16(_mm256_add_epi16(D, D), _mm256_sub_epi16(_mm256_set1_epi16(16384), A));
+                const __m256i out = _mm256_min_epi16(_mm256_max_epi16(_mm256_add_epi16(t, S), zero), top);
+                // A below 1: the destination stays.
+                v[q] = _mm256_blendv_epi8(D, out, _mm256_cmpgt_epi16(A, zero));
+            }
+            // [0 1 4 5 | 2 3 6 7] -> 0 .. 7
+            _mm256_storeu_si256(reinterpret_cast<__m256i*>(d), _mm256_permute4x64_epi64(_mm256_packus_epi16(v[0], v[1]), 0xD8));
+        }
+        this->pos = p;
+        return k;
+    }
+#endif
+
     // The general source-alpha rule on whole RGBQ pixels at level 4096; other
-    // levels, and what is left of a run, take the walk's own loop.
+    // levels, and what is left of a run, take the walk's own loop. Lines
+    // within the limits of alpha_run16 take it, with alpha_run8 for the
+    // eights that overshoot.
     int32_t general_alpha_run(const MapContext& c, typename Dst::sample* d, int32_t n, bool clamp)
     {
 #if defined(LORVEX_ISA_AVX2)
-        if constexpr (has_general_alpha_run)
-            if (c.level == 4096) return alpha_run8<false>(d, n, clamp);
+        if constexpr (has_general_alpha_run) {
+            if (c.level != 4096) return 0;
+            const int32_t m = n & ~7;
+            if (m == 0) return 0;
+            if (!colour_within_14_bits(m)) return alpha_run8<false>(d, n, clamp);
+            int32_t done = 0;
+            while (done < m) {
+                done += clamp ? alpha_run16<true>(d + 4 * done, m - done) : alpha_run16<false>(d + 4 * done, m - done);
+                if (done < m) done += alpha_run8<false>(d + 4 * done, 8, clamp);
+            }
+            return done;
+        }
 #endif
         (void)c, (void)d, (void)n, (void)clamp;
         return 0;
@@ -1340,34 +1459,10 @@ struct LinearSamplerV : LinearSampler<Units> {
 #endif
 
 #if defined(LORVEX_ISA_AVX2)
-    // Whether elements [from, to) of the line all lie within +-16383.
-    static bool within_14_bits(const int16_t* line, int32_t from, int32_t to)
-    {
-        __m256i lo = _mm256_setzero_si256(), hi = lo;
-        int32_t e = from;
-        for (; e + 32 <= to; e += 32) {
-            const __m256i x = _mm256_loadu_si256(reinterpret_cast<const __m256i*>(line + e));
-            const __m256i y = _mm256_loadu_si256(reinterpret_cast<const __m256i*>(line + e + 16));
-            lo = _mm256_min_epi16(lo, _mm256_min_epi16(x, y));
-            hi = _mm256_max_epi16(hi, _mm256_max_epi16(x, y));
-        }
-        const __m256i bad = _mm256_or_si256(_mm256_cmpgt_epi16(_mm256_set1_epi16(-16384), lo),
-                                            _mm256_cmpgt_epi16(hi, _mm256_set1_epi16(16383)));
-        bool out = !_mm256_testz_si256(bad, bad);
-        for (; e < to; ++e) out |= line[e] < -16384 || line[e] > 16383;
-        return !out;
-    }
-
-    // Eight whole 8-bit RGBQ pixels at a time in 16-bit lanes, at level 4096,
-    // for lines whose elements stay within +-16383 (those of every vertical
-    // filter without overshoot; others take quad_run8). With d = b - a,
-    // a (0x10000 - f) + b f = a 2^16 + d f, and its rounded value
-    // floor((a 2^16 + d f + 2^(15 + cs)) / 2^(16 + cs)) is
-    // (a + floor(d f / 2^16) + 2^(cs - 1)) >> cs: the low half of d f is a
-    // fraction below one that cannot carry into it. For the unsigned f,
-    // floor(d f / 2^16) is the signed high product with f read as signed,
-    // plus d where f's top bit is set. Every term fits 16 bits within these
-    // limits. Returns the pixels drawn.
+    // Eight whole 8-bit RGBQ pixels at a time in 16-bit lanes (lerp4_16), at
+    // level 4096, for lines whose elements stay within +-16383 (those of
+    // every vertical filter without overshoot; others take quad_run8).
+    // Returns the pixels drawn.
     template <bool clamp>
     int32_t quad_run16(typename Dst::sample* d, int32_t n)
     {
@@ -1376,38 +1471,20 @@ struct LinearSamplerV : LinearSampler<Units> {
             (void)d, (void)n;
             return 0;
         } else {
-            const int32_t step = this->step;
             const int32_t m = n & ~7;
-            if (m == 0 || step <= 0) return 0;
-            const int32_t i_first = this->pos >> 16;
-            const int32_t i_last = int32_t((int64_t(this->pos) + int64_t(m - 1) * step) >> 16);
-            if (!within_14_bits(this->line, 4 * i_first, 4 * i_last + 8)) return 0;
+            if (m == 0 || !colour_within_14_bits(m)) return 0;
             int32_t p = this->pos;
-            const __m256i steps = _mm256_mullo_epi32(_mm256_setr_epi32(0, 1, 2, 3, 4, 5, 6, 7), _mm256_set1_epi32(step));
-            const __m256i round = _mm256_set1_epi16(int16_t(1 << (cs - 1)));
-            const __m256i pick0 = _mm256_setr_epi32(0, 0, 1, 1, 2, 2, 3, 3), pick1 = _mm256_setr_epi32(4, 4, 5, 5, 6, 6, 7, 7);
+            const __m256i steps = _mm256_mullo_epi32(_mm256_setr_epi32(0, 1, 2, 3, 4, 5, 6, 7), _mm256_set1_epi32(this->step));
             alignas(32) int32_t at[8];
             for (int32_t k = 0; k < m; k += 8, d += 32) {
                 const __m256i P = _mm256_add_epi32(_mm256_set1_epi32(p), steps);
-                const __m256i f = _mm256_and_si256(P, _mm256_set1_epi32(0xFFFF));
-                const __m256i f2 = _mm256_or_si256(f, _mm256_slli_epi32(f, 16));  // f in both 16-bit halves
+                const __m256i f2 = twice16(P);
                 _mm256_store_si256(reinterpret_cast<__m256i*>(at), _mm256_slli_epi32(_mm256_srai_epi32(P, 16), 2));
                 asm volatile("" : : "r"(at) : "memory");
-                p += 8 * step;
+                p += 8 * this->step;
                 __m256i g[2];
                 for (int q = 0; q < 2; ++q) {
-                    // Pixels 4q .. 4q + 3 as [0 1 | 2 3]: a and b of each from one load.
-                    const auto two = [&](int x, int y) {
-                        return _mm256_inserti128_si256(
-                            _mm256_castsi128_si256(_mm_loadu_si128(reinterpret_cast<const __m128i*>(this->line + at[x]))),
-                            _mm_loadu_si128(reinterpret_cast<const __m128i*>(this->line + at[y])), 1);
-                    };
-                    const __m256i x = two(4 * q, 4 * q + 2), y = two(4 * q + 1, 4 * q + 3);
-                    const __m256i a = _mm256_unpacklo_epi64(x, y), b = _mm256_unpackhi_epi64(x, y);
-                    const __m256i F = _mm256_permutevar8x32_epi32(f2, q ? pick1 : pick0);
-                    const __m256i dv = _mm256_sub_epi16(b, a);
-                    const __m256i high = _mm256_add_epi16(_mm256_mulhi_epi16(dv, F), _mm256_and_si256(dv, _mm256_srai_epi16(F, 15)));
-                    __m256i v = _mm256_srai_epi16(_mm256_add_epi16(_mm256_add_epi16(a, high), round), cs);
+                    __m256i v = lerp4_16<cs>(this->line, at + 4 * q, spread4(f2, q));
                     if constexpr (clamp)
                         v = _mm256_min_epi16(_mm256_max_epi16(v, _mm256_setzero_si256()), _mm256_set1_epi16(255));
                     else
@@ -1421,6 +1498,16 @@ struct LinearSamplerV : LinearSampler<Units> {
             this->pos = p;
             return m;
         }
+    }
+
+    // Whether the colour elements the next m pixels read (those of their
+    // pixel and the next) lie within +-16383.
+    bool colour_within_14_bits(int32_t m) const
+    {
+        if (m <= 0 || this->step <= 0) return false;
+        const int32_t i_first = this->pos >> 16;
+        const int32_t i_last = int32_t((int64_t(this->pos) + int64_t(m - 1) * this->step) >> 16);
+        return within(this->line, 4 * i_first, 4 * i_last + 8, -16384, 16383);
     }
 #endif
 

@@ -93,6 +93,9 @@ int compare_random_strip(const Table& t, std::mt19937& rng, const std::vector<Si
             for (int k = 0; k < run && i < 4096; ++k, ++i)
                 c.line_a[i] = kind < 5 ? kinds[kind] : int16_t(rng() % 16385);
         }
+    if (fixed.extremes)
+        for (int i = 0; i < 4096; ++i)
+            if (rng() % 40 == 0) c.line_a[i] = int16_t(rng() % 2 ? -8193 - int(rng() % 24000) : 24576 + int(rng() % 8000));
     const int bank = int(rng() % 3);
     const int16_t* rows[3] = {&BANK_CUBIC[rng() % 49][0][0], &BANK_LANCZOS3[rng() % 28][0][0],
                               &BANK_SOFT[rng() % 113][0][0]};
