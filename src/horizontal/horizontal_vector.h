@@ -129,6 +129,20 @@ inline __m256i lerp4_16(const int16_t* line, const int32_t* at, __m256i F)
     return _mm256_srai_epi16(_mm256_add_epi16(_mm256_add_epi16(a, high), _mm256_set1_epi16(int16_t(1 << (cs - 1)))), cs);
 }
 
+// The pairs (w[i], w[i + 1]) of a line of words for eight indices i within
+// i0 .. i0 + 8, as 32-bit lanes: two loads (pairs from i0 + 2k and from
+// i0 + 2k + 1) and a pick by each index's parity, where a gather would be
+// slower. Reads words i0 .. i0 + 16 (inside the line buffer's storage).
+inline __m256i near_pairs(const int16_t* w, int32_t i0, __m256i i)
+{
+    const __m256i o = _mm256_sub_epi32(i, _mm256_set1_epi32(i0));
+    const __m256i half = _mm256_srli_epi32(o, 1);
+    const __m256i even = _mm256_permutevar8x32_epi32(_mm256_loadu_si256(reinterpret_cast<const __m256i*>(w + i0)), half);
+    const __m256i odd = _mm256_permutevar8x32_epi32(_mm256_loadu_si256(reinterpret_cast<const __m256i*>(w + i0 + 1)), half);
+    return _mm256_castps_si256(
+        _mm256_blendv_ps(_mm256_castsi256_ps(even), _mm256_castsi256_ps(odd), _mm256_castsi256_ps(_mm256_slli_epi32(o, 31))));
+}
+
 // Spreads four of eight 32-bit lanes (the low four, or the high) over pairs
 // of lanes, [j j j+1 j+1 | ...]: with twice16, a pixel's value in its four
 // 16-bit lanes.
@@ -1314,12 +1328,14 @@ struct LinearSamplerV : LinearSampler<Units> {
         const __m256i zero = _mm256_setzero_si256(), top = _mm256_set1_epi16(int16_t(Dst::max));
         const __m256i steps = _mm256_mullo_epi32(_mm256_setr_epi32(0, 1, 2, 3, 4, 5, 6, 7), _mm256_set1_epi32(this->step));
         int32_t p = this->pos;
+        const bool near = this->step >= 0 && this->step <= 0x12000;  // eight positions within nine samples
         alignas(32) int32_t at[8];
         int32_t k = 0;
         for (; k + 8 <= n; k += 8, d += 32) {
             const __m256i P = _mm256_add_epi32(_mm256_set1_epi32(p), steps);
             const __m256i i = _mm256_srai_epi32(P, 16), f = _mm256_and_si256(P, _mm256_set1_epi32(0xFFFF));
-            const __m256i g = _mm256_i32gather_epi32(reinterpret_cast<const int*>(this->line_a), i, 2);
+            const __m256i g = near ? near_pairs(this->line_a, p >> 16, i)
+                                   : _mm256_i32gather_epi32(reinterpret_cast<const int*>(this->line_a), i, 2);
             const __m256i alpha =
                 lerp_lanes<0>(_mm256_srai_epi32(_mm256_slli_epi32(g, 16), 16), _mm256_srai_epi32(g, 16), f);
             const __m256i over = _mm256_cmpgt_epi32(alpha, _mm256_set1_epi32(16384));
