@@ -957,6 +957,77 @@ struct AreaSamplerV : AreaSampler<Units> {
 #endif
 
 #if defined(LORVEX_ISA_AVX2)
+    // quad_area_run in 16-bit lanes, at level 4096, for 8-bit RGBQ whose
+    // line elements stay within +-16383 (those of every vertical filter
+    // without overshoot). As n0 = 0x10000 - n1 - n2 (n0 at least 1, so n1
+    // and n2 below 0x10000), x = s0 0x10000 + d1 n1 + d2 n2 with
+    // d = s - s0; each d n is 0x10000 H + l with H its high product (signed
+    // d, unsigned n: the signed one plus d where n's top bit is set) and l
+    // its low half, and x rounds to (s0 + H1 + H2 + c + 2^(cs - 1)) >> cs,
+    // c the carry of l1 + l2: what is left below 0x10000 cannot reach the
+    // result. Returns the pixels drawn, a multiple of eight.
+    template <bool clamp>
+    int32_t quad_area_run16(typename Dst::sample* d, int32_t pixels)
+    {
+        constexpr int cs = Units::colour_shift;
+        if constexpr (cs < 1 || cs > 14 || sizeof(typename Dst::sample) != 1) {
+            (void)d, (void)pixels;
+            return 0;
+        } else {
+            const int32_t w = this->w;
+            if (w < 0x8000 || this->r <= 0 || this->r > w || pixels < 8) return 0;
+            const int32_t m = pixels & ~7;
+            int32_t u0 = w - this->r;
+            const int32_t q_last = int32_t((int64_t(u0) + int64_t(m - 1) * 0x10000) / w);
+            if (!within(this->line, 4 * this->p, 4 * (this->p + q_last + 3), -16384, 16383)) return 0;
+            const int16_t* base = this->line + 4 * this->p;
+            const __m256i round = _mm256_set1_epi16(int16_t((1 << (cs - 1)) + 1));  // + 1: c is 1 + (no carry ? -1 : 0)
+            const __m256i ones = _mm256_set1_epi16(-1);
+            Spans spans(u0, 0x10000, w, 0x10000, {0, 1, 2, 3, 4, 5, 6, 7});
+            alignas(32) int32_t at[8];
+            for (int32_t k = 0; k < m; k += 8, d += 32, spans.next()) {
+                const Widths v = spans.widths();
+                _mm256_store_si256(reinterpret_cast<__m256i*>(at), _mm256_slli_epi32(v.q, 2));
+                asm volatile("" : : "r"(at) : "memory");
+                const __m256i n1 = twice16(v.n1), n2 = twice16(v.n2);
+                __m256i g[2];
+                for (int q = 0; q < 2; ++q) {
+                    const int32_t* a = at + 4 * q;
+                    const auto two = [&](int x, int y, int e) {
+                        return _mm256_inserti128_si256(
+                            _mm256_castsi128_si256(_mm_loadu_si128(reinterpret_cast<const __m128i*>(base + a[x] + e))),
+                            _mm_loadu_si128(reinterpret_cast<const __m128i*>(base + a[y] + e)), 1);
+                    };
+                    // Pixels [0 1 | 2 3] of the four: their samples q, q + 1 and q + 2.
+                    const __m256i X = two(0, 2, 0), Y = two(1, 3, 0), Z = two(0, 2, 8), W = two(1, 3, 8);
+                    const __m256i s0 = _mm256_unpacklo_epi64(X, Y), s1 = _mm256_unpackhi_epi64(X, Y);
+                    const __m256i s2 = _mm256_unpacklo_epi64(Z, W);
+                    const __m256i d1 = _mm256_sub_epi16(s1, s0), d2 = _mm256_sub_epi16(s2, s0);
+                    const __m256i N1 = spread4(n1, q), N2 = spread4(n2, q);
+                    const __m256i h1 = _mm256_add_epi16(_mm256_mulhi_epi16(d1, N1), _mm256_and_si256(d1, _mm256_srai_epi16(N1, 15)));
+                    const __m256i h2 = _mm256_add_epi16(_mm256_mulhi_epi16(d2, N2), _mm256_and_si256(d2, _mm256_srai_epi16(N2, 15)));
+                    const __m256i l1 = _mm256_mullo_epi16(d1, N1), nl2 = _mm256_xor_si256(_mm256_mullo_epi16(d2, N2), ones);
+                    const __m256i no_carry = _mm256_cmpeq_epi16(_mm256_max_epu16(l1, nl2), nl2);  // l1 <= ~l2
+                    const __m256i sum = _mm256_add_epi16(_mm256_add_epi16(_mm256_add_epi16(s0, h1), _mm256_add_epi16(h2, no_carry)), round);
+                    __m256i out = _mm256_srai_epi16(sum, cs);
+                    if constexpr (clamp)
+                        out = _mm256_min_epi16(_mm256_max_epi16(out, _mm256_setzero_si256()), _mm256_set1_epi16(255));
+                    else
+                        out = _mm256_and_si256(out, _mm256_set1_epi16(0xFF));  // the low bits, as the scalar rule stores them
+                    g[q] = out;
+                }
+                // [0 1 4 5 | 2 3 6 7] -> 0 .. 7
+                _mm256_storeu_si256(reinterpret_cast<__m256i*>(d), _mm256_permute4x64_epi64(_mm256_packus_epi16(g[0], g[1]), 0xD8));
+            }
+            u0 += m * 0x10000;
+            this->p += u0 / w;
+            this->r = w - u0 % w;
+            return m;
+        }
+    }
+#endif
+
+#if defined(LORVEX_ISA_AVX2)
     // The first sample q and the widths n0, n1, n2 that spans [U, U + span)
     // take of samples q, q + 1, q + 2 of a walk whose samples are W wide
     // (U from the start of the walk's current sample; span <= 2 W).
@@ -1157,6 +1228,11 @@ struct AreaSamplerV : AreaSampler<Units> {
             }
         }
         if constexpr (!Dst::pairs && Dst::colour_samples == 4) {
+            if (L == 4096) {
+                const int32_t fast = clamp ? quad_area_run16<true>(d, 2 * n) : quad_area_run16<false>(d, 2 * n);
+                d += 4 * fast;
+                n -= fast / 2;
+            }
             const int32_t pixels = 2 * n;
             const int32_t done = with_run_flags(
                 clamp, L, [&](auto limit, auto full) { return quad_area_run<limit(), full()>(c, d, pixels); });
