@@ -235,6 +235,13 @@ struct BankSamplerV {
                 __m128i* q = reinterpret_cast<__m128i*>(qc[p]);
                 for (int g = 0; g < kGroups; ++g) {
                     const int w = 8 * g;
+                    if (taps - w == 4) {
+                        // A group of four taps: pixels w and w + 1 interleaved in
+                        // the first lane, w + 2 and w + 3 in the second.
+                        _mm_store_si128(q + 4 * g + 0, two(w + 0, w + 1));
+                        _mm_store_si128(q + 4 * g + 1, two(w + 2, w + 3));
+                        continue;
+                    }
                     _mm_store_si128(q + 4 * g + 0, two(w + 0, w + 4));  // low interleave, first lane
                     _mm_store_si128(q + 4 * g + 1, two(w + 2, w + 6));  // low interleave, second lane
                     _mm_store_si128(q + 4 * g + 2, two(w + 1, w + 5));  // high interleave, first lane
@@ -614,8 +621,16 @@ struct BankSamplerV {
         __m256i acc = _mm256_setzero_si256();
         for (int g = 0; g < kGroups; ++g) {
             const __m256i a = _mm256_loadu_si256(reinterpret_cast<const __m256i*>(w + 32 * g));
-            const __m256i b = taps <= 8 * g + 4 ? _mm256_setzero_si256()
-                                                : _mm256_loadu_si256(reinterpret_cast<const __m256i*>(w + 32 * g + 16));
+            if (taps - 8 * g == 4) {
+                // Four taps: the samples of pixels 0 and 1 (2 and 3) interleaved
+                // within their lane, one multiply-add.
+                const __m256i pairs = _mm256_shuffle_epi8(
+                    a, _mm256_setr_epi8(0, 1, 8, 9, 2, 3, 10, 11, 4, 5, 12, 13, 6, 7, 14, 15, 0, 1, 8, 9, 2, 3, 10, 11, 4,
+                                        5, 12, 13, 6, 7, 14, 15));
+                acc = _mm256_add_epi32(acc, _mm256_madd_epi16(pairs, _mm256_load_si256(reinterpret_cast<const __m256i*>(t + 32 * g))));
+                continue;
+            }
+            const __m256i b = _mm256_loadu_si256(reinterpret_cast<const __m256i*>(w + 32 * g + 16));
             const __m256i lo = _mm256_madd_epi16(_mm256_unpacklo_epi16(a, b),
                                                  _mm256_load_si256(reinterpret_cast<const __m256i*>(t + 32 * g)));
             const __m256i hi = _mm256_madd_epi16(_mm256_unpackhi_epi16(a, b),
