@@ -1513,6 +1513,106 @@ struct LinearSamplerV : LinearSampler<Units> {
             quad_run(c, d, n, clamp);
     }
 
+#if defined(LORVEX_ISA_AVX2)
+    // Whole 4:2:2 pairs at magnification and level 4096, eight at a time in
+    // 16-bit lanes, from the line split into planes a chunk at a time, for
+    // chunks whose elements stay within +-16000. Luma as lerp4_16 does.
+    // Chroma lies between pairs j and j + 1 at F = h 0x10000 + f, h the
+    // parity of the pair's first luma sample: a (0x20000 - F) + b F rounds to
+    // (2 a + d h + floor(d f / 2^16) + 2^cs) >> (cs + 1) with d = b - a, the
+    // low half of d f again too small to reach it; the sums stay within 16
+    // bits for elements within +-16000. The neighbouring samples of eight
+    // positions come from two loads (near_pairs), which the step of at most
+    // one sample allows. Returns the pairs drawn.
+    template <bool clamp>
+    int32_t pair_run16(typename Dst::sample* d, int32_t n)
+    {
+        using S = typename Dst::sample;
+        constexpr int cs = Units::colour_shift;
+        constexpr int32_t kCap = 1024;  // pixels of a chunk's planes
+        if constexpr (cs < 1 || cs > 14) {
+            (void)d, (void)n;
+            return 0;
+        } else {
+            const int32_t step = this->step;
+            if (step <= 0 || step > 0x10000 || n < 8) return 0;
+            // The planes, with room for the sixteen words near_pairs reads
+            // past a block's first index.
+            alignas(32) int16_t planes[2 * kCap + 128];
+            int16_t* const Y = planes;
+            int16_t* const U = planes + kCap + 32;
+            int16_t* const V = planes + kCap + kCap / 2 + 80;
+            constexpr int32_t kPerChunk = ((kCap - 8) / 2) & ~7;  // two luma samples a pair at most, and the next
+            const __m256i t8 = _mm256_mullo_epi32(_mm256_setr_epi32(0, 1, 2, 3, 4, 5, 6, 7), _mm256_set1_epi32(step));
+            const __m256i round_y = _mm256_set1_epi16(int16_t(1 << (cs - 1))), round_c = _mm256_set1_epi16(int16_t(1 << cs));
+            const __m256i pair_order = _mm256_setr_epi32(0, 1, 4, 5, 2, 3, 6, 7);
+            const __m256i zero = _mm256_setzero_si256(), top = _mm256_set1_epi16(int16_t(Dst::max));
+            const auto low_half = [](__m256i g) { return _mm256_srai_epi32(_mm256_slli_epi32(g, 16), 16); };
+            const auto high = [](__m256i dv, __m256i F) {  // floor(dv F / 2^16), F unsigned
+                return _mm256_add_epi16(_mm256_mulhi_epi16(dv, F), _mm256_and_si256(dv, _mm256_srai_epi16(F, 15)));
+            };
+            const auto finish = [&](__m256i v) {
+                if constexpr (clamp) return _mm256_min_epi16(_mm256_max_epi16(v, zero), top);
+                if constexpr (sizeof(S) == 1) return _mm256_and_si256(v, _mm256_set1_epi16(0xFF));
+                return v;  // sixteen bits, as the scalar rule stores them
+            };
+            int32_t done = 0;
+            while (n - done >= 8) {
+                const int32_t m = std::min((n - done) & ~7, kPerChunk);
+                const int32_t p0 = this->pos;
+                const int32_t b = (p0 >> 16) & ~1;
+                const int32_t i_last = int32_t((int64_t(p0) + int64_t(2 * m - 1) * step) >> 16);
+                const int32_t e = (i_last & ~1) + 4;  // luma i_last + 1, chroma of pair i_last / 2 + 1
+                if (e - b > kCap || !within(this->line, 2 * b, 2 * e, -16000, 16000)) break;
+                split_422(this->line, b, e - b, Y, U, V);
+                int32_t p = p0 - (b << 16);  // positions within the planes
+                for (int32_t k = 0; k < m; k += 8, d += 32, p += 16 * step) {
+                    // Luma outputs 0 .. 7 and 8 .. 15 (Y0 Y1 of pairs 0 .. 3, 4 .. 7).
+                    const __m256i P0 = _mm256_add_epi32(_mm256_set1_epi32(p), t8);
+                    const __m256i P1 = _mm256_add_epi32(_mm256_set1_epi32(p + 8 * step), t8);
+                    const __m256i g0 = near_pairs(Y, p >> 16, _mm256_srai_epi32(P0, 16));
+                    const __m256i g1 = near_pairs(Y, (p + 8 * step) >> 16, _mm256_srai_epi32(P1, 16));
+                    const __m256i mask16 = _mm256_set1_epi32(0xFFFF);
+                    // [0-3 8-11 | 4-7 12-15]
+                    const __m256i a = _mm256_packs_epi32(low_half(g0), low_half(g1));
+                    const __m256i bv = _mm256_packs_epi32(_mm256_srai_epi32(g0, 16), _mm256_srai_epi32(g1, 16));
+                    const __m256i F = _mm256_packus_epi32(_mm256_and_si256(P0, mask16), _mm256_and_si256(P1, mask16));
+                    const __m256i luma =
+                        finish(_mm256_srai_epi16(_mm256_add_epi16(_mm256_add_epi16(a, high(_mm256_sub_epi16(bv, a), F)), round_y), cs));
+                    // Chroma of pairs 0 .. 7 at their first luma position.
+                    const __m256i Pe = _mm256_add_epi32(_mm256_set1_epi32(p), _mm256_add_epi32(t8, t8));
+                    const __m256i ie = _mm256_srai_epi32(Pe, 16);
+                    const __m256i j = _mm256_srai_epi32(ie, 1);
+                    const __m256i gu = near_pairs(U, (p >> 16) >> 1, j), gv = near_pairs(V, (p >> 16) >> 1, j);
+                    // [Cb 0-3 Cr 0-3 | Cb 4-7 Cr 4-7]
+                    const __m256i ca = _mm256_packs_epi32(low_half(gu), low_half(gv));
+                    const __m256i cd = _mm256_sub_epi16(_mm256_packs_epi32(_mm256_srai_epi32(gu, 16), _mm256_srai_epi32(gv, 16)), ca);
+                    const __m256i fe = _mm256_and_si256(Pe, mask16);
+                    const __m256i cf = _mm256_packus_epi32(fe, fe);
+                    const __m256i odd = _mm256_sub_epi32(zero, _mm256_and_si256(ie, _mm256_set1_epi32(1)));
+                    const __m256i h = _mm256_packs_epi32(odd, odd);
+                    const __m256i sum = _mm256_add_epi16(_mm256_add_epi16(_mm256_add_epi16(ca, ca), _mm256_and_si256(cd, h)),
+                                                         _mm256_add_epi16(high(cd, cf), round_c));
+                    const __m256i chroma = finish(_mm256_srai_epi16(sum, cs + 1));
+                    // Pairs in memory order: luma (Y0, Y1) words and (Cb, Cr) words interleaved.
+                    const __m256i lp = _mm256_permutevar8x32_epi32(luma, pair_order);
+                    const __m256i cc = _mm256_unpacklo_epi16(chroma, _mm256_srli_si256(chroma, 8));
+                    const __m256i x = _mm256_unpacklo_epi16(lp, cc), z = _mm256_unpackhi_epi16(lp, cc);  // [0 1 | 4 5], [2 3 | 6 7]
+                    if constexpr (sizeof(S) == 1) {
+                        _mm256_storeu_si256(reinterpret_cast<__m256i*>(d), _mm256_packus_epi16(x, z));
+                    } else {
+                        _mm256_storeu_si256(reinterpret_cast<__m256i*>(d), _mm256_permute2x128_si256(x, z, 0x20));
+                        _mm256_storeu_si256(reinterpret_cast<__m256i*>(d + 16), _mm256_permute2x128_si256(x, z, 0x31));
+                    }
+                }
+                this->pos = p0 + 2 * m * step;
+                done += m;
+            }
+            return done;
+        }
+    }
+#endif
+
     // 4:2:2: the two lumas and the pair's chroma of each pair, straight into
     // the destination by the whole-pixel rule.
     void pair_run(const MapContext& c, typename Dst::sample* d, int32_t n, bool clamp)
@@ -1520,6 +1620,13 @@ struct LinearSamplerV : LinearSampler<Units> {
         using T = typename Dst::sample;
         constexpr int cs = Units::colour_shift;
         const int32_t L = c.level;
+#if defined(LORVEX_ISA_AVX2)
+        if (L == 4096) {
+            const int32_t fast = clamp ? pair_run16<true>(d, n) : pair_run16<false>(d, n);
+            d += 4 * fast;
+            n -= fast;
+        }
+#endif
         const auto put = [&](T* at, int32_t v) { put_whole<Dst>(at, v, clamp, L); };
         const int16_t* line = this->line;
         for (int32_t k = 0; k < n; ++k, d += 4) {
