@@ -183,6 +183,32 @@ inline void store_rgbq8(uint8_t* d, const __m256i v[4])
     _mm256_storeu_si256(reinterpret_cast<__m256i*>(d),
                         _mm256_permutevar8x32_epi32(w, _mm256_setr_epi32(0, 4, 1, 5, 2, 6, 3, 7)));
 }
+
+// The general source-alpha rule at level 4096 on two RGBQ pixels in 32-bit
+// lanes, S in stored depth (limited already where the call limits), A each
+// lane's alpha in 1/16384, D the destination: clamp(((D (16384 - A) + 8192)
+// >> 14) + S), or where A is above 16384 clamp((S 16384) / A), the division
+// in double precision (exact for these operands; truncation is the integer
+// division's). A pixel whose A is below 1 keeps D.
+inline __m256i source_over2(__m256i S, __m256i A, __m256i D)
+{
+    const __m256i zero = _mm256_setzero_si256(), top = _mm256_set1_epi32(255), full = _mm256_set1_epi32(16384);
+    const __m256i t =
+        _mm256_srai_epi32(_mm256_add_epi32(_mm256_mullo_epi32(D, _mm256_sub_epi32(full, A)), _mm256_set1_epi32(8192)), 14);
+    __m256i out = _mm256_add_epi32(t, S);
+    const __m256i over = _mm256_cmpgt_epi32(A, full);
+    if (!_mm256_testz_si256(over, over)) {
+        const auto divide = [&](__m128i s, __m128i a) {
+            const __m256d q = _mm256_div_pd(_mm256_cvtepi32_pd(_mm_slli_epi32(s, 14)), _mm256_cvtepi32_pd(a));
+            return _mm256_cvttpd_epi32(q);
+        };
+        const __m256i r = _mm256_setr_m128i(divide(_mm256_castsi256_si128(S), _mm256_castsi256_si128(A)),
+                                            divide(_mm256_extracti128_si256(S, 1), _mm256_extracti128_si256(A, 1)));
+        out = _mm256_blendv_epi8(out, r, over);
+    }
+    out = _mm256_min_epi32(_mm256_max_epi32(out, zero), top);
+    return _mm256_blendv_epi8(D, out, _mm256_cmpgt_epi32(A, zero));
+}
 #endif
 
 template <class Units, int T>
@@ -220,7 +246,7 @@ struct BankSamplerV {
     // products for two taps into one 32-bit lane, in the sample's own lane
     // order. Per phase and group: the taps of the low and the high
     // interleave, (t0, t4) and (t2, t6), (t1, t5) and (t3, t7).
-    static constexpr bool kQuad = !Dst::pairs && !Dst::alpha_only && !Units::alpha && L == 16;
+    static constexpr bool kQuad = !Dst::pairs && !Dst::alpha_only && L == 16;
     static constexpr int kGroups = (taps + 7) / 8;
     alignas(32) int16_t qc[kQuad ? 16 : 1][kQuad ? kGroups * 32 : 1];
 
@@ -247,9 +273,7 @@ struct BankSamplerV {
                     _mm_store_si128(q + 4 * g + 2, two(w + 1, w + 5));  // high interleave, first lane
                     _mm_store_si128(q + 4 * g + 3, two(w + 3, w + 7));  // high interleave, second lane
                 }
-                continue;  // the RGBQ pixel samples from these taps alone
-            }
-            if constexpr (Dst::pairs) {
+            } else if constexpr (Dst::pairs) {
                 __m128i y[2], ch[2];
                 taps_of(row, y);
                 taps_of(c.hbank_c + p * 16, ch);
@@ -358,6 +382,67 @@ struct BankSamplerV {
         if constexpr (Units::alpha)
             px.a = mix_bank<Units::alpha_shift>(hsum(fold128(dot<kAlphaRegs>(line_a + (i - T), ca[ph]))));
     }
+
+#if defined(LORVEX_ISA_AVX2)
+    static constexpr bool has_general_alpha_run =
+        kQuad && Units::alpha && Units::alpha_shift == 0 && Units::colour_shift == Dst::buffer_shift;
+
+    // The general source-alpha rule on whole RGBQ pixels at level 4096, eight
+    // at a time: colour from the RGBQ bank sums, alpha from one multiply-add
+    // over its window (at most sixteen taps) and a sum of the eight, then
+    // source_over2. Returns the pixels drawn; other levels take the walk.
+    int32_t general_alpha_run(const MapContext& c, typename Dst::sample* d, int32_t n, bool clamp)
+    {
+        if constexpr (!has_general_alpha_run) {
+            (void)c, (void)d, (void)n, (void)clamp;
+            return 0;
+        } else {
+            static_assert(kAlphaRegs == 1);
+            constexpr int cs = Units::colour_shift;
+            if (c.level != 4096) return 0;
+            const __m256i round = _mm256_set1_epi32(1 << (13 + cs)), half = _mm256_set1_epi32(1 << 13);
+            const __m256i zero = _mm256_setzero_si256(), top = _mm256_set1_epi32(Dst::max);
+            const __m256i steps = _mm256_mullo_epi32(_mm256_setr_epi32(0, 1, 2, 3, 4, 5, 6, 7), _mm256_set1_epi32(step));
+            const __m256i fifteen = _mm256_set1_epi32(15), base = _mm256_set1_epi32(T);
+            alignas(32) int32_t at[8], ph[8];
+            int32_t p = pos;
+            int32_t k = 0;
+            for (; k + 8 <= n; k += 8, d += 32) {
+                const __m256i P = _mm256_add_epi32(_mm256_set1_epi32(p), steps);
+                _mm256_store_si256(reinterpret_cast<__m256i*>(at), _mm256_sub_epi32(_mm256_srai_epi32(P, 16), base));
+                _mm256_store_si256(reinterpret_cast<__m256i*>(ph), _mm256_and_si256(_mm256_srai_epi32(P, 12), fifteen));
+                asm volatile("" : : "r"(at), "r"(ph) : "memory");
+                p += 8 * step;
+                // Alpha of the eight: window sums folded to [0 1 2 3 | 4 5 6 7].
+                __m256i a[8];
+                for (int j = 0; j < 8; ++j)
+                    a[j] = _mm256_madd_epi16(_mm256_loadu_si256(reinterpret_cast<const __m256i*>(line_a + at[j])),
+                                             _mm256_load_si256(reinterpret_cast<const __m256i*>(ca[ph[j]])));
+                const __m256i h0 = _mm256_hadd_epi32(_mm256_hadd_epi32(a[0], a[1]), _mm256_hadd_epi32(a[2], a[3]));
+                const __m256i h1 = _mm256_hadd_epi32(_mm256_hadd_epi32(a[4], a[5]), _mm256_hadd_epi32(a[6], a[7]));
+                const __m256i sums = _mm256_add_epi32(_mm256_permute2x128_si256(h0, h1, 0x20), _mm256_permute2x128_si256(h0, h1, 0x31));
+                const __m256i alpha = _mm256_srai_epi32(_mm256_add_epi32(sums, half), 14);
+                __m256i v[4];
+                for (int q = 0; q < 4; ++q) {
+                    const __m256i s0 = quad_sums(8 * at[2 * q], ph[2 * q] * int32_t(sizeof(qc[0])));
+                    const __m256i s1 = quad_sums(8 * at[2 * q + 1], ph[2 * q + 1] * int32_t(sizeof(qc[0])));
+                    // [pixel 2q | pixel 2q + 1]
+                    const __m256i x = _mm256_add_epi32(_mm256_permute2x128_si256(s0, s1, 0x20),
+                                                       _mm256_permute2x128_si256(s0, s1, 0x31));
+                    __m256i S = _mm256_srai_epi32(_mm256_add_epi32(x, round), 14 + cs);
+                    if (clamp) S = _mm256_min_epi32(_mm256_max_epi32(S, zero), top);
+                    const __m256i A = _mm256_permutevar8x32_epi32(
+                        alpha, _mm256_setr_epi32(2 * q, 2 * q, 2 * q, 2 * q, 2 * q + 1, 2 * q + 1, 2 * q + 1, 2 * q + 1));
+                    const __m256i D = _mm256_cvtepu8_epi32(_mm_loadl_epi64(reinterpret_cast<const __m128i*>(d + 8 * q)));
+                    v[q] = source_over2(S, A, D);
+                }
+                store_rgbq8(d, v);
+            }
+            pos = p;
+            return k;
+        }
+    }
+#endif
 
     void advance() { pos += step; }
 
@@ -1337,12 +1422,10 @@ struct LinearSamplerV : LinearSampler<Units> {
 
     // Whole RGBQ pixels of the source-alpha tables, eight at a time, two to a
     // register. Fast: colour in buffer units, D = (S13 + ((D m) >> 9) + 16) >> 5
-    // with m = 16384 - A, stored with its low bits. General, at level 4096: S
-    // in stored depth (limited when `clamp`), D = clamp(((D (16384 - A) +
-    // 8192) >> 14) + S), or where A is above 16384 clamp((S 16384) / A), the
-    // division in double precision (exact for these operands; truncation is
-    // the integer division's). A pixel whose A is below 1 keeps D. Returns the
-    // pixels drawn, a multiple of eight.
+    // with m = 16384 - A, stored with its low bits; nothing written where A is
+    // below 1. General, at level 4096: S in stored depth (limited when
+    // `clamp`), then source_over2. Returns the pixels drawn, a multiple of
+    // eight.
     template <bool Fast>
     int32_t alpha_run8(typename Dst::sample* d, int32_t n, bool clamp)
     {
@@ -1370,31 +1453,16 @@ struct LinearSamplerV : LinearSampler<Units> {
                 __m256i S = colour2<cs>(at[2 * q], at[2 * q + 1], _mm256_permutevar8x32_epi32(f, pick));
                 const __m256i A = _mm256_permutevar8x32_epi32(alpha, pick);
                 const __m256i D = _mm256_cvtepu8_epi32(_mm_loadl_epi64(reinterpret_cast<const __m128i*>(d + 8 * q)));
-                __m256i out;
                 if constexpr (Fast) {
                     const __m256i t = _mm256_srai_epi32(_mm256_mullo_epi32(D, _mm256_sub_epi32(full, A)), 9);
-                    out = _mm256_srai_epi32(_mm256_add_epi32(_mm256_add_epi32(S, t), _mm256_set1_epi32(16)), 5);
+                    __m256i out = _mm256_srai_epi32(_mm256_add_epi32(_mm256_add_epi32(S, t), _mm256_set1_epi32(16)), 5);
                     out = _mm256_and_si256(out, _mm256_set1_epi32(0xFF));
+                    // A below 1: the destination stays.
+                    v[q] = _mm256_blendv_epi8(D, out, _mm256_cmpgt_epi32(A, _mm256_sub_epi32(one, one)));
                 } else {
                     if (clamp) S = _mm256_min_epi32(_mm256_max_epi32(S, zero), top);
-                    const __m256i t = _mm256_srai_epi32(
-                        _mm256_add_epi32(_mm256_mullo_epi32(D, _mm256_sub_epi32(full, A)), _mm256_set1_epi32(8192)), 14);
-                    out = _mm256_add_epi32(t, S);
-                    const __m256i over = _mm256_cmpgt_epi32(A, full);
-                    if (!_mm256_testz_si256(over, over)) {
-                        const auto divide = [&](__m128i s, __m128i a) {
-                            const __m256d q = _mm256_div_pd(_mm256_cvtepi32_pd(_mm_slli_epi32(s, 14)), _mm256_cvtepi32_pd(a));
-                            return _mm256_cvttpd_epi32(q);
-                        };
-                        const __m256i r = _mm256_setr_m128i(
-                            divide(_mm256_castsi256_si128(S), _mm256_castsi256_si128(A)),
-                            divide(_mm256_extracti128_si256(S, 1), _mm256_extracti128_si256(A, 1)));
-                        out = _mm256_blendv_epi8(out, r, over);
-                    }
-                    out = _mm256_min_epi32(_mm256_max_epi32(out, zero), top);
+                    v[q] = source_over2(S, A, D);
                 }
-                // A below 1: the destination stays.
-                v[q] = _mm256_blendv_epi8(D, out, _mm256_cmpgt_epi32(A, _mm256_sub_epi32(one, one)));
             }
             store_rgbq8(d, v);
         }
