@@ -383,23 +383,114 @@ struct BankSamplerV {
             px.a = mix_bank<Units::alpha_shift>(hsum(fold128(dot<kAlphaRegs>(line_a + (i - T), ca[ph]))));
     }
 
-#if defined(LORVEX_ISA_AVX2)
+    // Whole-pixel runs of the source-alpha tables: the general rule (at
+    // level 4096) for 4:2:2 and, with 256-bit vectors, RGBQ; the fast rule for
+    // 4:2:2.
+    static constexpr bool kAlphaRuns = Units::alpha && !Dst::alpha_only && Units::alpha_shift == 0;
     static constexpr bool has_general_alpha_run =
-        kQuad && Units::alpha && Units::alpha_shift == 0 && Units::colour_shift == Dst::buffer_shift;
+        kAlphaRuns && Units::colour_shift == Dst::buffer_shift && (Dst::pairs || kQuad);
+    static constexpr bool has_fast_alpha_run = kAlphaRuns && Dst::pairs && Units::colour_shift == 0;
 
+    int32_t general_alpha_run(const MapContext& c, typename Dst::sample* d, int32_t n, bool clamp)
+    {
+        if (c.level != 4096) return 0;
+        if constexpr (Dst::pairs) {
+            pair_alpha_run<false>(d, n, clamp);
+            return n;
+        } else {
+#if defined(LORVEX_ISA_AVX2)
+            return quad_alpha_run(d, n, clamp);
+#else
+            return 0;
+#endif
+        }
+    }
+
+    void fast_alpha_run(typename Dst::sample* d, int32_t n) { pair_alpha_run<true>(d, n, false); }
+
+    // 4:2:2 whole pairs of the source-alpha tables, a pair at a time in four
+    // 32-bit lanes in memory order [Y0 Cb Y1 Cr]: Y0, Cb and Cr take the even
+    // pixel's alpha A, Y1 the odd one's, and a sample whose pixel has an A
+    // below 1 keeps D. With o the sample's offset:
+    //   Fast (colour in buffer units, m = 16384 - A):
+    //     (S + (((D - o) m) >> (14 - sh)) + 2^(sh - 1)) >> sh, chroma limited,
+    //     luma stored with its low bits;
+    //   general (level 4096, S in stored depth, limited when `clamp`):
+    //     clamp((((D - o)(16384 - A) + 8192) >> 14) + S), or for the luma of a
+    //     pixel whose A is above 16384 clamp(((S - o) 16384) / A + o).
+    template <bool Fast>
+    void pair_alpha_run(typename Dst::sample* d, int32_t n, bool clamp)
+    {
+        using Sm = typename Dst::sample;
+        constexpr int sh = Dst::buffer_shift;
+        constexpr int cs = Units::colour_shift;
+        const __m128i o = _mm_setr_epi32(Dst::luma_offset, Dst::chroma_offset, Dst::luma_offset, Dst::chroma_offset);
+        const __m128i zero = _mm_setzero_si128(), top = _mm_set1_epi32(Dst::max), full = _mm_set1_epi32(16384);
+        const __m128i luma = _mm_setr_epi32(-1, 0, -1, 0);
+        const __m128i round = _mm_set1_epi32(1 << (13 + cs));
+        const __m128i pick = sizeof(Sm) == 1 ? _mm_setr_epi8(0, 4, 8, 12, -1, -1, -1, -1, -1, -1, -1, -1, -1, -1, -1, -1)
+                                             : _mm_setr_epi8(0, 1, 4, 5, 8, 9, 12, 13, -1, -1, -1, -1, -1, -1, -1, -1);
+        for (int32_t k = 0; k < n; ++k, d += 4) {
+            const int32_t i0 = pos >> 16, ph0 = (pos >> 12) & 15;
+            const int32_t p1 = pos + step, i1 = p1 >> 16, ph1 = (p1 >> 12) & 15;
+            const int32_t j = i0 >> 1, cph = (ph0 >> 1) + ((i0 & 1) ? 8 : 0);
+            pos = p1 + step;
+            const int32_t a0 = mix_bank<0>(hsum(fold128(dot<kAlphaRegs>(line_a + (i0 - T), ca[ph0]))));
+            const int32_t a1 = mix_bank<0>(hsum(fold128(dot<kAlphaRegs>(line_a + (i1 - T), ca[ph1]))));
+            if (a0 < 1 && a1 < 1) continue;
+            const __m128i y0 = fold128(dot<kLumaRegs>(line + 2 * (i0 - T), cy[ph0]));
+            const __m128i y1 = fold128(dot<kLumaRegs>(line + 2 * (i1 - T), cy[ph1]));
+            const __m128i ch = fold128(dot<kChromaRegs>(line + 4 * (j - T), cc[cph]));
+            // [Y0 Y1 Cb Cr] to the order in memory, Y0 Cb Y1 Cr.
+            const __m128i x = _mm_shuffle_epi32(reduce_pair(y0, y1, ch), _MM_SHUFFLE(3, 1, 2, 0));
+            __m128i S = _mm_srai_epi32(_mm_add_epi32(x, round), 14 + cs);
+            const __m128i A = _mm_setr_epi32(a0, a0, a1, a0);
+            const __m128i D = sizeof(Sm) == 1 ? _mm_cvtepu8_epi32(_mm_cvtsi32_si128(load32(d)))
+                                              : _mm_cvtepu16_epi32(_mm_loadl_epi64(reinterpret_cast<const __m128i*>(d)));
+            const __m128i Do = _mm_sub_epi32(D, o);
+            __m128i v;
+            if constexpr (Fast) {
+                const __m128i t = _mm_srai_epi32(_mm_mullo_epi32(Do, _mm_sub_epi32(full, A)), 14 - sh);
+                v = _mm_srai_epi32(_mm_add_epi32(_mm_add_epi32(S, t), _mm_set1_epi32(1 << (sh - 1))), sh);
+                v = _mm_blendv_epi8(_mm_min_epi32(_mm_max_epi32(v, zero), top), v, luma);
+            } else {
+                if (clamp) S = _mm_min_epi32(_mm_max_epi32(S, zero), top);
+                const __m128i t =
+                    _mm_srai_epi32(_mm_add_epi32(_mm_mullo_epi32(Do, _mm_sub_epi32(full, A)), _mm_set1_epi32(8192)), 14);
+                v = _mm_add_epi32(t, S);
+                if (a0 > 16384 || a1 > 16384) {
+                    alignas(16) int32_t sv[4], vv[4];
+                    _mm_store_si128(reinterpret_cast<__m128i*>(sv), S);
+                    _mm_store_si128(reinterpret_cast<__m128i*>(vv), v);
+                    if (a0 > 16384) vv[0] = ((sv[0] - Dst::luma_offset) * 16384) / a0 + Dst::luma_offset;
+                    if (a1 > 16384) vv[2] = ((sv[2] - Dst::luma_offset) * 16384) / a1 + Dst::luma_offset;
+                    v = _mm_load_si128(reinterpret_cast<const __m128i*>(vv));
+                }
+                v = _mm_min_epi32(_mm_max_epi32(v, zero), top);
+            }
+            // A pixel whose A is below 1 keeps D.
+            v = _mm_blendv_epi8(D, v, _mm_cmpgt_epi32(A, zero));
+            const __m128i out = _mm_shuffle_epi8(v, pick);
+            if constexpr (sizeof(Sm) == 1)
+                store32(d, _mm_cvtsi128_si32(out));
+            else
+                _mm_storel_epi64(reinterpret_cast<__m128i*>(d), out);
+        }
+    }
+
+#if defined(LORVEX_ISA_AVX2)
     // The general source-alpha rule on whole RGBQ pixels at level 4096, eight
     // at a time: colour from the RGBQ bank sums, alpha from one multiply-add
     // over its window (at most sixteen taps) and a sum of the eight, then
-    // source_over2. Returns the pixels drawn; other levels take the walk.
-    int32_t general_alpha_run(const MapContext& c, typename Dst::sample* d, int32_t n, bool clamp)
+    // source_over2. Returns the pixels drawn.
+    int32_t quad_alpha_run(typename Dst::sample* d, int32_t n, bool clamp)
     {
-        if constexpr (!has_general_alpha_run) {
-            (void)c, (void)d, (void)n, (void)clamp;
+        if constexpr (!kQuad || !has_general_alpha_run) {
+            (void)d, (void)n, (void)clamp;
             return 0;
         } else {
             static_assert(kAlphaRegs == 1);
             constexpr int cs = Units::colour_shift;
-            if (c.level != 4096) return 0;
             const __m256i round = _mm256_set1_epi32(1 << (13 + cs)), half = _mm256_set1_epi32(1 << 13);
             const __m256i zero = _mm256_setzero_si256(), top = _mm256_set1_epi32(Dst::max);
             const __m256i steps = _mm256_mullo_epi32(_mm256_setr_epi32(0, 1, 2, 3, 4, 5, 6, 7), _mm256_set1_epi32(step));
