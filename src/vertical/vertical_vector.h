@@ -257,6 +257,9 @@ struct StraightLanes {
 #endif
 };
 
+// The most lines a straight sum weighs: the widest bank.
+constexpr int32_t kMaxStraightLines = 16;
+
 // The alpha of the pixels [0, pixels) of a straight strip, four at a time:
 // (sum w_k a_k) >> 12 saturated, or a x 4 for one line.
 template <class Src, class Row, class Weight>
@@ -265,6 +268,33 @@ inline void straight_alpha_V(const MapContext& ctx, const StripRecord& s, int32_
 {
     int16_t* out_a = ctx.line_a + s.pad_left;
     int32_t x = 0;
+#if defined(LORVEX_ISA_AVX2)
+    // Sixteen pixels at a time, pairs of lines by one multiply-add, while the
+    // words stay below 32768 (every alpha word of a picture does).
+    if (n <= kMaxStraightLines) {
+        int32_t coef[kMaxStraightLines / 2];
+        const uint16_t* arow[kMaxStraightLines];
+        for (int32_t k = 0; k < n; ++k) arow[k] = reinterpret_cast<const uint16_t*>(row(k).second) + x0;
+        for (int32_t k = 0; k < n; k += 2) coef[k / 2] = coef_pair(weight(k), k + 1 < n ? weight(k + 1) : 0);
+        for (; x + 16 <= pixels; x += 16) {
+            __m256i lo = _mm256_setzero_si256(), hi = lo, bad = lo;
+            for (int32_t k = 0; k < n; k += 2) {
+                const auto words = [&](int32_t m) {
+                    const __m256i w = _mm256_loadu_si256(reinterpret_cast<const __m256i*>(arow[m] + x));
+                    bad = _mm256_or_si256(bad, w);
+                    return w;
+                };
+                const __m256i a0 = words(k), a1 = k + 1 < n ? words(k + 1) : _mm256_setzero_si256();
+                const __m256i c = _mm256_set1_epi32(coef[k / 2]);
+                lo = _mm256_add_epi32(lo, _mm256_madd_epi16(_mm256_unpacklo_epi16(a0, a1), c));
+                hi = _mm256_add_epi32(hi, _mm256_madd_epi16(_mm256_unpackhi_epi16(a0, a1), c));
+            }
+            if (_mm256_movemask_epi8(bad) & 0xAAAAAAAA) break;  // a word of 32768 or more
+            _mm256_storeu_si256(reinterpret_cast<__m256i*>(out_a + x),
+                                _mm256_packs_epi32(_mm256_srai_epi32(lo, 12), _mm256_srai_epi32(hi, 12)));
+        }
+    }
+#endif
     for (; x + 4 <= pixels; x += 4) {
         __m128i sum = _mm_setzero_si128();
         for (int32_t k = 0; k < n; ++k) {
@@ -283,6 +313,78 @@ inline void straight_alpha_V(const MapContext& ctx, const StripRecord& s, int32_
     }
 }
 
+#if defined(LORVEX_ISA_AVX2)
+// straight_sum_V sixteen elements at a time in 16-bit lanes, while the
+// samples and alpha words allow. P = ((v - offset) a) >> shift is the high
+// product of (v - offset) 2^s1 and a 2^3 (s1 = 13 - shift; a 2^3 taken as
+// unsigned: the signed product plus the first factor where its top bit is
+// set), exact while both factors fit 16 bits: alpha words below 8192, and
+// for 10-bit samples words below 2048 (8-bit samples always fit). Pairs of
+// lines are then weighed by one multiply-add into the same 32-bit sums.
+// Returns the elements drawn; it stops before the first register beyond
+// those limits.
+template <class Src, class Row, class Weight>
+int32_t straight_sum16(const Span<Src>& sp, int32_t n, Row row, Weight weight)
+{
+    constexpr int E = Src::elements_per_pixel;
+    constexpr int s1 = 13 - Src::premul_shift;
+    static_assert(s1 >= 0);
+    constexpr bool bytes = sizeof(typename Src::sample) == 1;
+    const __m256i off = _mm256_set1_epi32(int32_t(uint32_t(Src::luma_offset) | uint32_t(Src::chroma_offset) << 16));
+    const __m256i base = _mm256_set1_epi32(int32_t(uint32_t(Src::luma_base) | uint32_t(Src::chroma_base) << 16));
+    // Each element's alpha word: its pixel's (chroma: the even pixel of its pair).
+    const __m256i spread = Src::pairs ? _mm256_setr_epi8(0, 1, 0, 1, 2, 3, 0, 1, 4, 5, 4, 5, 6, 7, 4, 5,  //
+                                                         8, 9, 8, 9, 10, 11, 8, 9, 12, 13, 12, 13, 14, 15, 12, 13)
+                                      : _mm256_setr_epi8(0, 1, 0, 1, 0, 1, 0, 1, 2, 3, 2, 3, 2, 3, 2, 3,  //
+                                                         4, 5, 4, 5, 4, 5, 4, 5, 6, 7, 6, 7, 6, 7, 6, 7);
+    if (n > kMaxStraightLines) return 0;
+    const typename Src::sample* vrow[kMaxStraightLines];
+    const uint16_t* arow[kMaxStraightLines];
+    int32_t coef[kMaxStraightLines / 2];
+    for (int32_t k = 0; k < n; ++k) {
+        const LinePair l = row(k);
+        vrow[k] = src_row<Src>(l.first) + sp.first;
+        arow[k] = reinterpret_cast<const uint16_t*>(l.second) + sp.first / E;
+    }
+    for (int32_t k = 0; k < n; k += 2) coef[k / 2] = coef_pair(weight(k), k + 1 < n ? weight(k + 1) : 0);
+    const auto premultiplied = [&](int32_t k, int32_t e, __m256i& bad) {
+        const auto* v = vrow[k] + e;
+        const uint16_t* a = arow[k] + e / E;
+        const __m256i x = bytes ? _mm256_cvtepu8_epi16(_mm_loadu_si128(reinterpret_cast<const __m128i*>(v)))
+                                : _mm256_loadu_si256(reinterpret_cast<const __m256i*>(v));
+        const __m128i words = Src::pairs ? _mm_loadu_si128(reinterpret_cast<const __m128i*>(a))
+                                         : _mm_loadl_epi64(reinterpret_cast<const __m128i*>(a));
+        const __m256i aw = _mm256_shuffle_epi8(_mm256_broadcastsi128_si256(words), spread);
+        bad = _mm256_or_si256(bad, _mm256_srli_epi16(aw, 13));
+        if constexpr (!bytes) bad = _mm256_or_si256(bad, _mm256_srli_epi16(x, 11));
+        const __m256i f = _mm256_slli_epi16(_mm256_sub_epi16(x, Src::pairs ? off : _mm256_setzero_si256()), s1);
+        const __m256i g = _mm256_slli_epi16(aw, 3);
+        return _mm256_add_epi16(_mm256_mulhi_epi16(f, g), _mm256_and_si256(f, _mm256_srai_epi16(g, 15)));
+    };
+    int32_t e = 0;
+    for (; e + 16 <= sp.count; e += 16) {
+        __m256i bad = _mm256_setzero_si256(), out;
+        if (n == 1) {
+            out = premultiplied(0, e, bad);  // 16384 P >> 14 is P
+        } else {
+            __m256i lo = _mm256_setzero_si256(), hi = lo;
+            for (int32_t k = 0; k < n; k += 2) {
+                const __m256i p0 = premultiplied(k, e, bad);
+                const __m256i p1 = k + 1 < n ? premultiplied(k + 1, e, bad) : _mm256_setzero_si256();
+                const __m256i c = _mm256_set1_epi32(coef[k / 2]);
+                lo = _mm256_add_epi32(lo, _mm256_madd_epi16(_mm256_unpacklo_epi16(p0, p1), c));
+                hi = _mm256_add_epi32(hi, _mm256_madd_epi16(_mm256_unpackhi_epi16(p0, p1), c));
+            }
+            out = _mm256_packs_epi32(_mm256_srai_epi32(lo, 14), _mm256_srai_epi32(hi, 14));
+        }
+        if (!_mm256_testz_si256(bad, bad)) break;
+        _mm256_storeu_si256(reinterpret_cast<__m256i*>(sp.out + e),
+                            _mm256_add_epi16(out, Src::pairs ? base : _mm256_setzero_si256()));
+    }
+    return e;
+}
+#endif
+
 // The weighted sum of n premultiplied lines, as straight_sum: colour
 // saturate((sum w_k P_k) >> 14) + base with P_k = ((v_k - offset) a_k) >>
 // premul_shift, alpha (sum w_k a_k) >> 12; the elements the registers leave
@@ -296,6 +398,9 @@ void straight_sum_V(const MapContext& ctx, const StripRecord& s, int32_t n, Row 
     const __m128i base = V::bases();
     const Span<Src> sp(ctx, s);
     int32_t e = 0;
+#if defined(LORVEX_ISA_AVX2)
+    e = straight_sum16<Src>(sp, n, row, weight);
+#endif
     for (; e + V::kLanes <= sp.count; e += V::kLanes) {
         const int32_t se = sp.first + e;
         typename V::reg sum = V::zero();
