@@ -57,6 +57,57 @@ inline void put_whole(typename Dst::sample* at, int32_t v, bool clamp, int32_t l
     *at = typename Dst::sample(level == 4096 ? v : (int32_t(*at) * (4096 - level) + v * level + 2048) >> 12);
 }
 
+// One whole 4:2:2 pair of the source-alpha tables in four 32-bit lanes in
+// memory order [Y0 Cb Y1 Cr]: S its samples, a0 the even pixel's alpha (Y0,
+// Cb and Cr take it), a1 the odd one's (Y1); a sample whose pixel has an
+// alpha A below 1 keeps D. With o the sample's offset:
+//   Fast (colour in buffer units, m = 16384 - A):
+//     (S + (((D - o) m) >> (14 - sh)) + 2^(sh - 1)) >> sh, chroma limited,
+//     luma stored with its low bits;
+//   general (level 4096, S in stored depth, limited when `clamp`):
+//     clamp((((D - o)(16384 - A) + 8192) >> 14) + S), or for the luma of a
+//     pixel whose A is above 16384 clamp(((S - o) 16384) / A + o).
+template <class Dst, bool Fast>
+inline void pair_over(typename Dst::sample* d, __m128i S, int32_t a0, int32_t a1, bool clamp)
+{
+    using Sm = typename Dst::sample;
+    constexpr int sh = Dst::buffer_shift;
+    const __m128i o = _mm_setr_epi32(Dst::luma_offset, Dst::chroma_offset, Dst::luma_offset, Dst::chroma_offset);
+    const __m128i zero = _mm_setzero_si128(), top = _mm_set1_epi32(Dst::max), full = _mm_set1_epi32(16384);
+    const __m128i A = _mm_setr_epi32(a0, a0, a1, a0);
+    const __m128i D = sizeof(Sm) == 1 ? _mm_cvtepu8_epi32(_mm_cvtsi32_si128(load32(d)))
+                                      : _mm_cvtepu16_epi32(_mm_loadl_epi64(reinterpret_cast<const __m128i*>(d)));
+    const __m128i Do = _mm_sub_epi32(D, o);
+    __m128i v;
+    if constexpr (Fast) {
+        const __m128i t = _mm_srai_epi32(_mm_mullo_epi32(Do, _mm_sub_epi32(full, A)), 14 - sh);
+        v = _mm_srai_epi32(_mm_add_epi32(_mm_add_epi32(S, t), _mm_set1_epi32(1 << (sh - 1))), sh);
+        v = _mm_blendv_epi8(_mm_min_epi32(_mm_max_epi32(v, zero), top), v, _mm_setr_epi32(-1, 0, -1, 0));
+    } else {
+        if (clamp) S = _mm_min_epi32(_mm_max_epi32(S, zero), top);
+        const __m128i t =
+            _mm_srai_epi32(_mm_add_epi32(_mm_mullo_epi32(Do, _mm_sub_epi32(full, A)), _mm_set1_epi32(8192)), 14);
+        v = _mm_add_epi32(t, S);
+        if (a0 > 16384 || a1 > 16384) {
+            alignas(16) int32_t sv[4], vv[4];
+            _mm_store_si128(reinterpret_cast<__m128i*>(sv), S);
+            _mm_store_si128(reinterpret_cast<__m128i*>(vv), v);
+            if (a0 > 16384) vv[0] = ((sv[0] - Dst::luma_offset) * 16384) / a0 + Dst::luma_offset;
+            if (a1 > 16384) vv[2] = ((sv[2] - Dst::luma_offset) * 16384) / a1 + Dst::luma_offset;
+            v = _mm_load_si128(reinterpret_cast<const __m128i*>(vv));
+        }
+        v = _mm_min_epi32(_mm_max_epi32(v, zero), top);
+    }
+    v = _mm_blendv_epi8(D, v, _mm_cmpgt_epi32(A, zero));
+    const __m128i pick = sizeof(Sm) == 1 ? _mm_setr_epi8(0, 4, 8, 12, -1, -1, -1, -1, -1, -1, -1, -1, -1, -1, -1, -1)
+                                         : _mm_setr_epi8(0, 1, 4, 5, 8, 9, 12, 13, -1, -1, -1, -1, -1, -1, -1, -1);
+    const __m128i out = _mm_shuffle_epi8(v, pick);
+    if constexpr (sizeof(Sm) == 1)
+        store32(d, _mm_cvtsi128_si32(out));
+    else
+        _mm_storel_epi64(reinterpret_cast<__m128i*>(d), out);
+}
+
 #if defined(LORVEX_ISA_AVX2)
 // Pixels [b, b + count) of the 4:2:2 line (b even, count even) split
 // into planes: luma from pixel b on, Cb and Cr from pair b / 2 on.
@@ -408,28 +459,13 @@ struct BankSamplerV {
 
     void fast_alpha_run(typename Dst::sample* d, int32_t n) { pair_alpha_run<true>(d, n, false); }
 
-    // 4:2:2 whole pairs of the source-alpha tables, a pair at a time in four
-    // 32-bit lanes in memory order [Y0 Cb Y1 Cr]: Y0, Cb and Cr take the even
-    // pixel's alpha A, Y1 the odd one's, and a sample whose pixel has an A
-    // below 1 keeps D. With o the sample's offset:
-    //   Fast (colour in buffer units, m = 16384 - A):
-    //     (S + (((D - o) m) >> (14 - sh)) + 2^(sh - 1)) >> sh, chroma limited,
-    //     luma stored with its low bits;
-    //   general (level 4096, S in stored depth, limited when `clamp`):
-    //     clamp((((D - o)(16384 - A) + 8192) >> 14) + S), or for the luma of a
-    //     pixel whose A is above 16384 clamp(((S - o) 16384) / A + o).
+    // 4:2:2 whole pairs of the source-alpha tables (pair_over): colour from
+    // the vector dot products, alpha of both pixels from their windows.
     template <bool Fast>
     void pair_alpha_run(typename Dst::sample* d, int32_t n, bool clamp)
     {
-        using Sm = typename Dst::sample;
-        constexpr int sh = Dst::buffer_shift;
         constexpr int cs = Units::colour_shift;
-        const __m128i o = _mm_setr_epi32(Dst::luma_offset, Dst::chroma_offset, Dst::luma_offset, Dst::chroma_offset);
-        const __m128i zero = _mm_setzero_si128(), top = _mm_set1_epi32(Dst::max), full = _mm_set1_epi32(16384);
-        const __m128i luma = _mm_setr_epi32(-1, 0, -1, 0);
         const __m128i round = _mm_set1_epi32(1 << (13 + cs));
-        const __m128i pick = sizeof(Sm) == 1 ? _mm_setr_epi8(0, 4, 8, 12, -1, -1, -1, -1, -1, -1, -1, -1, -1, -1, -1, -1)
-                                             : _mm_setr_epi8(0, 1, 4, 5, 8, 9, 12, 13, -1, -1, -1, -1, -1, -1, -1, -1);
         for (int32_t k = 0; k < n; ++k, d += 4) {
             const int32_t i0 = pos >> 16, ph0 = (pos >> 12) & 15;
             const int32_t p1 = pos + step, i1 = p1 >> 16, ph1 = (p1 >> 12) & 15;
@@ -443,38 +479,7 @@ struct BankSamplerV {
             const __m128i ch = fold128(dot<kChromaRegs>(line + 4 * (j - T), cc[cph]));
             // [Y0 Y1 Cb Cr] to the order in memory, Y0 Cb Y1 Cr.
             const __m128i x = _mm_shuffle_epi32(reduce_pair(y0, y1, ch), _MM_SHUFFLE(3, 1, 2, 0));
-            __m128i S = _mm_srai_epi32(_mm_add_epi32(x, round), 14 + cs);
-            const __m128i A = _mm_setr_epi32(a0, a0, a1, a0);
-            const __m128i D = sizeof(Sm) == 1 ? _mm_cvtepu8_epi32(_mm_cvtsi32_si128(load32(d)))
-                                              : _mm_cvtepu16_epi32(_mm_loadl_epi64(reinterpret_cast<const __m128i*>(d)));
-            const __m128i Do = _mm_sub_epi32(D, o);
-            __m128i v;
-            if constexpr (Fast) {
-                const __m128i t = _mm_srai_epi32(_mm_mullo_epi32(Do, _mm_sub_epi32(full, A)), 14 - sh);
-                v = _mm_srai_epi32(_mm_add_epi32(_mm_add_epi32(S, t), _mm_set1_epi32(1 << (sh - 1))), sh);
-                v = _mm_blendv_epi8(_mm_min_epi32(_mm_max_epi32(v, zero), top), v, luma);
-            } else {
-                if (clamp) S = _mm_min_epi32(_mm_max_epi32(S, zero), top);
-                const __m128i t =
-                    _mm_srai_epi32(_mm_add_epi32(_mm_mullo_epi32(Do, _mm_sub_epi32(full, A)), _mm_set1_epi32(8192)), 14);
-                v = _mm_add_epi32(t, S);
-                if (a0 > 16384 || a1 > 16384) {
-                    alignas(16) int32_t sv[4], vv[4];
-                    _mm_store_si128(reinterpret_cast<__m128i*>(sv), S);
-                    _mm_store_si128(reinterpret_cast<__m128i*>(vv), v);
-                    if (a0 > 16384) vv[0] = ((sv[0] - Dst::luma_offset) * 16384) / a0 + Dst::luma_offset;
-                    if (a1 > 16384) vv[2] = ((sv[2] - Dst::luma_offset) * 16384) / a1 + Dst::luma_offset;
-                    v = _mm_load_si128(reinterpret_cast<const __m128i*>(vv));
-                }
-                v = _mm_min_epi32(_mm_max_epi32(v, zero), top);
-            }
-            // A pixel whose A is below 1 keeps D.
-            v = _mm_blendv_epi8(D, v, _mm_cmpgt_epi32(A, zero));
-            const __m128i out = _mm_shuffle_epi8(v, pick);
-            if constexpr (sizeof(Sm) == 1)
-                store32(d, _mm_cvtsi128_si32(out));
-            else
-                _mm_storel_epi64(reinterpret_cast<__m128i*>(d), out);
+            pair_over<Dst, Fast>(d, _mm_srai_epi32(_mm_add_epi32(x, round), 14 + cs), a0, a1, clamp);
         }
     }
 
@@ -1457,8 +1462,8 @@ struct LinearSamplerV : LinearSampler<Units> {
     using Dst = typename Units::Dst;
     using Base::Base;
     static constexpr bool has_plain_run = !Units::alpha && !Dst::alpha_only;
-    static constexpr bool has_fast_alpha_run = Units::alpha && Units::colour_shift == 0 &&
-                                               Units::alpha_shift == 0 && !Dst::pairs && !Dst::alpha_only;
+    static constexpr bool has_fast_alpha_run =
+        Units::alpha && Units::colour_shift == 0 && Units::alpha_shift == 0 && !Dst::alpha_only;
 
     // The four samples of the pixel at pos, in 64-bit lanes, shifted right by
     // `shift` (the low halves of the lanes hold the results).
@@ -1476,8 +1481,8 @@ struct LinearSamplerV : LinearSampler<Units> {
         return _mm_castps_si128(_mm_shuffle_ps(_mm_castsi128_ps(lo), _mm_castsi128_ps(hi), _MM_SHUFFLE(2, 0, 2, 0)));
     }
 
-    static constexpr bool has_general_alpha_run = Units::alpha && Units::alpha_shift == 0 && !Dst::pairs &&
-                                                  !Dst::alpha_only && Units::colour_shift == Dst::buffer_shift;
+    static constexpr bool has_general_alpha_run =
+        Units::alpha && Units::alpha_shift == 0 && !Dst::alpha_only && Units::colour_shift == Dst::buffer_shift;
 
 #if defined(LORVEX_ISA_AVX2)
     // The four samples of the RGBQ pixels at positions p0 and p1, in 32-bit
@@ -1502,13 +1507,6 @@ struct LinearSamplerV : LinearSampler<Units> {
     {
         const __m256i x = _mm256_add_epi32(_mm256_slli_epi32(a, 16), _mm256_mullo_epi32(_mm256_sub_epi32(b, a), f));
         return _mm256_srai_epi32(_mm256_add_epi32(_mm256_srai_epi32(x, cs), _mm256_set1_epi32(1 << 15)), 16);
-    }
-
-    // Source alpha at a position, in 1/16384.
-    int32_t alpha_at(int32_t p) const
-    {
-        const int32_t i = p >> 16, f = p & 0xFFFF;
-        return int32_t((int64_t(this->line_a[i]) * (0x10000 - f) + int64_t(this->line_a[i + 1]) * f + 32768) >> 16);
     }
 
     // Whole RGBQ pixels of the source-alpha tables, eight at a time, two to a
@@ -1619,8 +1617,13 @@ struct LinearSamplerV : LinearSampler<Units> {
     // eights that overshoot.
     int32_t general_alpha_run(const MapContext& c, typename Dst::sample* d, int32_t n, bool clamp)
     {
+        if constexpr (Dst::pairs) {
+            if (c.level != 4096) return 0;
+            pair_alpha_run<false>(d, n, clamp);
+            return n;
+        }
 #if defined(LORVEX_ISA_AVX2)
-        if constexpr (has_general_alpha_run) {
+        if constexpr (has_general_alpha_run && !Dst::pairs) {
             if (c.level != 4096) return 0;
             const int32_t m = n & ~7;
             if (m == 0) return 0;
@@ -1640,10 +1643,45 @@ struct LinearSamplerV : LinearSampler<Units> {
     // The fast source-alpha rule on n whole RGBQ pixels: colour in buffer
     // units, D = (S13 + ((D m) >> 9) + 16) >> 5 with m = 16384 - A, nothing
     // written where A is below 1.
+    // Source alpha at a position, in 1/16384.
+    int32_t alpha_at(int32_t p) const
+    {
+        const int32_t i = p >> 16, f = p & 0xFFFF;
+        return int32_t((int64_t(this->line_a[i]) * (0x10000 - f) + int64_t(this->line_a[i + 1]) * f + 32768) >> 16);
+    }
+
+    // 4:2:2 whole pairs of the source-alpha tables (pair_over), each sample
+    // and alpha interpolated as the scalar sampler does.
+    template <bool Fast>
+    void pair_alpha_run(typename Dst::sample* d, int32_t n, bool clamp)
+    {
+        constexpr int cs = Units::colour_shift;
+        const int16_t* line = this->line;
+        for (int32_t k = 0; k < n; ++k, d += 4) {
+            const int32_t p0 = this->pos, p1 = p0 + this->step;
+            this->pos = p1 + this->step;
+            const int32_t a0 = alpha_at(p0), a1 = alpha_at(p1);
+            if (a0 < 1 && a1 < 1) continue;
+            const int32_t i = p0 >> 16, f = p0 & 0xFFFF, i1 = p1 >> 16, f1 = p1 & 0xFFFF;
+            const int32_t j = i >> 1;
+            const int32_t w0 = (i & 1) ? 0x10000 - f : 0x20000 - f, w1 = (i & 1) ? 0x10000 + f : f;
+            const __m128i S = _mm_setr_epi32(
+                mix_w16<cs>(int64_t(line[2 * i]) * (0x10000 - f) + int64_t(line[2 * i + 2]) * f),
+                mix_w17<cs>(int64_t(line[4 * j + 1]) * w0 + int64_t(line[4 * j + 5]) * w1),
+                mix_w16<cs>(int64_t(line[2 * i1]) * (0x10000 - f1) + int64_t(line[2 * i1 + 2]) * f1),
+                mix_w17<cs>(int64_t(line[4 * j + 3]) * w0 + int64_t(line[4 * j + 7]) * w1));
+            pair_over<Dst, Fast>(d, S, a0, a1, clamp);
+        }
+    }
+
     void fast_alpha_run(typename Dst::sample* d, int32_t n)
     {
+        if constexpr (Dst::pairs) {
+            pair_alpha_run<true>(d, n, false);
+            return;
+        }
 #if defined(LORVEX_ISA_AVX2)
-        if constexpr (has_fast_alpha_run) {
+        if constexpr (has_fast_alpha_run && !Dst::pairs) {
             const int32_t done = alpha_run8<true>(d, n, false);
             d += 4 * done;
             n -= done;
