@@ -235,6 +235,20 @@ inline void store_rgbq8(uint8_t* d, const __m256i v[4])
                         _mm256_permutevar8x32_epi32(w, _mm256_setr_epi32(0, 4, 1, 5, 2, 6, 3, 7)));
 }
 
+// Eight RGBQ pixels from two registers of four in 16-bit lanes, [0 1 | 2 3]
+// and [4 5 | 6 7]: limited to 0 .. 255 when Clamp, else cut to their low
+// byte as the scalar rule stores them.
+template <bool Clamp>
+inline void store_rgbq8_16(uint8_t* d, __m256i g0, __m256i g1)
+{
+    const auto cut = [](__m256i v) {
+        if constexpr (Clamp) return _mm256_min_epi16(_mm256_max_epi16(v, _mm256_setzero_si256()), _mm256_set1_epi16(255));
+        return _mm256_and_si256(v, _mm256_set1_epi16(0xFF));
+    };
+    // [0 1 4 5 | 2 3 6 7] -> 0 .. 7
+    _mm256_storeu_si256(reinterpret_cast<__m256i*>(d), _mm256_permute4x64_epi64(_mm256_packus_epi16(cut(g0), cut(g1)), 0xD8));
+}
+
 // The general source-alpha rule at level 4096 on two RGBQ pixels in 32-bit
 // lanes, S in stored depth (limited already where the call limits), A each
 // lane's alpha in 1/16384, D the destination: clamp(((D (16384 - A) + 8192)
@@ -1205,15 +1219,9 @@ struct AreaSamplerV : AreaSampler<Units> {
                     const __m256i l1 = _mm256_mullo_epi16(d1, N1), nl2 = _mm256_xor_si256(_mm256_mullo_epi16(d2, N2), ones);
                     const __m256i no_carry = _mm256_cmpeq_epi16(_mm256_max_epu16(l1, nl2), nl2);  // l1 <= ~l2
                     const __m256i sum = _mm256_add_epi16(_mm256_add_epi16(_mm256_add_epi16(s0, h1), _mm256_add_epi16(h2, no_carry)), round);
-                    __m256i out = _mm256_srai_epi16(sum, cs);
-                    if constexpr (clamp)
-                        out = _mm256_min_epi16(_mm256_max_epi16(out, _mm256_setzero_si256()), _mm256_set1_epi16(255));
-                    else
-                        out = _mm256_and_si256(out, _mm256_set1_epi16(0xFF));  // the low bits, as the scalar rule stores them
-                    g[q] = out;
+                    g[q] = _mm256_srai_epi16(sum, cs);
                 }
-                // [0 1 4 5 | 2 3 6 7] -> 0 .. 7
-                _mm256_storeu_si256(reinterpret_cast<__m256i*>(d), _mm256_permute4x64_epi64(_mm256_packus_epi16(g[0], g[1]), 0xD8));
+                store_rgbq8_16<clamp>(d, g[0], g[1]);
             }
             u0 += m * 0x10000;
             this->p += u0 / w;
@@ -1603,8 +1611,7 @@ struct LinearSamplerV : LinearSampler<Units> {
                 // A below 1: the destination stays.
                 v[q] = _mm256_blendv_epi8(D, out, _mm256_cmpgt_epi16(A, zero));
             }
-            // [0 1 4 5 | 2 3 6 7] -> 0 .. 7
-            _mm256_storeu_si256(reinterpret_cast<__m256i*>(d), _mm256_permute4x64_epi64(_mm256_packus_epi16(v[0], v[1]), 0xD8));
+            store_rgbq8_16<true>(d, v[0], v[1]);
         }
         this->pos = p;
         return k;
@@ -1893,18 +1900,8 @@ struct LinearSamplerV : LinearSampler<Units> {
                 _mm256_store_si256(reinterpret_cast<__m256i*>(at), _mm256_slli_epi32(_mm256_srai_epi32(P, 16), 2));
                 asm volatile("" : : "r"(at) : "memory");
                 p += 8 * this->step;
-                __m256i g[2];
-                for (int q = 0; q < 2; ++q) {
-                    __m256i v = lerp4_16<cs>(this->line, at + 4 * q, spread4(f2, q));
-                    if constexpr (clamp)
-                        v = _mm256_min_epi16(_mm256_max_epi16(v, _mm256_setzero_si256()), _mm256_set1_epi16(255));
-                    else
-                        v = _mm256_and_si256(v, _mm256_set1_epi16(0xFF));  // the low bits, as the scalar rule stores them
-                    g[q] = v;
-                }
-                // [0 1 4 5 | 2 3 6 7] -> 0 .. 7
-                _mm256_storeu_si256(reinterpret_cast<__m256i*>(d),
-                                    _mm256_permute4x64_epi64(_mm256_packus_epi16(g[0], g[1]), 0xD8));
+                store_rgbq8_16<clamp>(d, lerp4_16<cs>(this->line, at, spread4(f2, 0)),
+                                      lerp4_16<cs>(this->line, at + 4, spread4(f2, 1)));
             }
             this->pos = p;
             return m;
