@@ -1195,33 +1195,45 @@ struct AreaSamplerV : AreaSampler<Units> {
             const __m256i ones = _mm256_set1_epi16(-1);
             Spans spans(u0, 0x10000, w, 0x10000, {0, 1, 2, 3, 4, 5, 6, 7});
             alignas(32) int32_t at[8];
-            for (int32_t k = 0; k < m; k += 8, d += 32, spans.next()) {
-                const Widths v = spans.widths();
-                _mm256_store_si256(reinterpret_cast<__m256i*>(at), _mm256_slli_epi32(v.q, 2));
-                asm volatile("" : : "r"(at) : "memory");
-                const __m256i n1 = twice16(v.n1), n2 = twice16(v.n2);
-                __m256i g[2];
-                for (int q = 0; q < 2; ++q) {
-                    const int32_t* a = at + 4 * q;
-                    const auto two = [&](int x, int y, int e) {
-                        return _mm256_inserti128_si256(
-                            _mm256_castsi128_si256(_mm_loadu_si128(reinterpret_cast<const __m128i*>(base + a[x] + e))),
-                            _mm_loadu_si128(reinterpret_cast<const __m128i*>(base + a[y] + e)), 1);
-                    };
-                    // Pixels [0 1 | 2 3] of the four: their samples q, q + 1 and q + 2.
-                    const __m256i X = two(0, 2, 0), Y = two(1, 3, 0), Z = two(0, 2, 8), W = two(1, 3, 8);
-                    const __m256i s0 = _mm256_unpacklo_epi64(X, Y), s1 = _mm256_unpackhi_epi64(X, Y);
-                    const __m256i s2 = _mm256_unpacklo_epi64(Z, W);
-                    const __m256i d1 = _mm256_sub_epi16(s1, s0), d2 = _mm256_sub_epi16(s2, s0);
-                    const __m256i N1 = spread4(n1, q), N2 = spread4(n2, q);
-                    const __m256i h1 = _mm256_add_epi16(_mm256_mulhi_epi16(d1, N1), _mm256_and_si256(d1, _mm256_srai_epi16(N1, 15)));
-                    const __m256i h2 = _mm256_add_epi16(_mm256_mulhi_epi16(d2, N2), _mm256_and_si256(d2, _mm256_srai_epi16(N2, 15)));
-                    const __m256i l1 = _mm256_mullo_epi16(d1, N1), nl2 = _mm256_xor_si256(_mm256_mullo_epi16(d2, N2), ones);
-                    const __m256i no_carry = _mm256_cmpeq_epi16(_mm256_max_epu16(l1, nl2), nl2);  // l1 <= ~l2
-                    const __m256i sum = _mm256_add_epi16(_mm256_add_epi16(_mm256_add_epi16(s0, h1), _mm256_add_epi16(h2, no_carry)), round);
-                    g[q] = _mm256_srai_epi16(sum, cs);
+            if (w >= 0x10000) {
+                // Magnification: a pixel meets two samples at most (n2 is 0),
+                // and the sum is the interpolation of lerp4_16 at n1.
+                for (int32_t k = 0; k < m; k += 8, d += 32, spans.next()) {
+                    const Widths v = spans.widths();
+                    _mm256_store_si256(reinterpret_cast<__m256i*>(at), _mm256_slli_epi32(v.q, 2));
+                    asm volatile("" : : "r"(at) : "memory");
+                    const __m256i n1 = twice16(v.n1);
+                    store_rgbq8_16<clamp>(d, lerp4_16<cs>(base, at, spread4(n1, 0)), lerp4_16<cs>(base, at + 4, spread4(n1, 1)));
                 }
-                store_rgbq8_16<clamp>(d, g[0], g[1]);
+            } else {
+                for (int32_t k = 0; k < m; k += 8, d += 32, spans.next()) {
+                    const Widths v = spans.widths();
+                    _mm256_store_si256(reinterpret_cast<__m256i*>(at), _mm256_slli_epi32(v.q, 2));
+                    asm volatile("" : : "r"(at) : "memory");
+                    const __m256i n1 = twice16(v.n1), n2 = twice16(v.n2);
+                    __m256i g[2];
+                    for (int q = 0; q < 2; ++q) {
+                        const int32_t* a = at + 4 * q;
+                        const auto two = [&](int x, int y, int e) {
+                            return _mm256_inserti128_si256(
+                                _mm256_castsi128_si256(_mm_loadu_si128(reinterpret_cast<const __m128i*>(base + a[x] + e))),
+                                _mm_loadu_si128(reinterpret_cast<const __m128i*>(base + a[y] + e)), 1);
+                        };
+                        // Pixels [0 1 | 2 3] of the four: their samples q, q + 1 and q + 2.
+                        const __m256i X = two(0, 2, 0), Y = two(1, 3, 0), Z = two(0, 2, 8), W = two(1, 3, 8);
+                        const __m256i s0 = _mm256_unpacklo_epi64(X, Y), s1 = _mm256_unpackhi_epi64(X, Y);
+                        const __m256i s2 = _mm256_unpacklo_epi64(Z, W);
+                        const __m256i d1 = _mm256_sub_epi16(s1, s0), d2 = _mm256_sub_epi16(s2, s0);
+                        const __m256i N1 = spread4(n1, q), N2 = spread4(n2, q);
+                        const __m256i h1 = _mm256_add_epi16(_mm256_mulhi_epi16(d1, N1), _mm256_and_si256(d1, _mm256_srai_epi16(N1, 15)));
+                        const __m256i h2 = _mm256_add_epi16(_mm256_mulhi_epi16(d2, N2), _mm256_and_si256(d2, _mm256_srai_epi16(N2, 15)));
+                        const __m256i l1 = _mm256_mullo_epi16(d1, N1), nl2 = _mm256_xor_si256(_mm256_mullo_epi16(d2, N2), ones);
+                        const __m256i no_carry = _mm256_cmpeq_epi16(_mm256_max_epu16(l1, nl2), nl2);  // l1 <= ~l2
+                        const __m256i sum = _mm256_add_epi16(_mm256_add_epi16(_mm256_add_epi16(s0, h1), _mm256_add_epi16(h2, no_carry)), round);
+                        g[q] = _mm256_srai_epi16(sum, cs);
+                    }
+                    store_rgbq8_16<clamp>(d, g[0], g[1]);
+                }
             }
             u0 += m * 0x10000;
             this->p += u0 / w;
