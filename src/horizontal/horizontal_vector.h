@@ -209,6 +209,60 @@ inline __m256i twice16(__m256i v)
     return _mm256_or_si256(_mm256_and_si256(v, _mm256_set1_epi32(0xFFFF)), _mm256_slli_epi32(v, 16));
 }
 
+// Eight whole 4:2:2 pairs from split planes in 16-bit lanes. Luma output t
+// (Y0 Y1 of pairs 0 .. 3 for t = 0 .. 7 in i0 and f0, of pairs 4 .. 7 in i1
+// and f1) lies between Y[i] and Y[i + 1] at the fraction f < 0x10000: as
+// lerp4_16 does. The chroma of pair k lies between (U, V)[j] and [j + 1] at
+// F = h 0x10000 + f (h and f in odd and fc): a (0x20000 - F) + b F rounds to
+// (2 a + d h + floor(d f / 2^16) + 2^cs) >> (cs + 1) with d = b - a, the low
+// half of d f again too small to reach it. Sums stay within 16 bits for
+// elements within +-16000. The indices of each eight lie within nine
+// samples of their first (near_pairs). Stored limited to 0 .. max when Clamp,
+// else with their low bits, as the scalar rule stores them.
+template <class Dst, int cs, bool Clamp>
+inline void pairs8_16(typename Dst::sample* d, const int16_t* Y, const int16_t* U, const int16_t* V, __m256i i0,
+                      __m256i f0, __m256i i1, __m256i f1, __m256i j, __m256i odd, __m256i fc)
+{
+    using S = typename Dst::sample;
+    const __m256i zero = _mm256_setzero_si256(), top = _mm256_set1_epi16(int16_t(Dst::max));
+    const auto low_half = [](__m256i g) { return _mm256_srai_epi32(_mm256_slli_epi32(g, 16), 16); };
+    const auto high = [](__m256i dv, __m256i F) {  // floor(dv F / 2^16), F unsigned
+        return _mm256_add_epi16(_mm256_mulhi_epi16(dv, F), _mm256_and_si256(dv, _mm256_srai_epi16(F, 15)));
+    };
+    const auto finish = [&](__m256i v) {
+        if constexpr (Clamp) return _mm256_min_epi16(_mm256_max_epi16(v, zero), top);
+        if constexpr (sizeof(S) == 1) return _mm256_and_si256(v, _mm256_set1_epi16(0xFF));
+        return v;  // sixteen bits
+    };
+    const __m256i g0 = near_pairs(Y, _mm256_cvtsi256_si32(i0), i0), g1 = near_pairs(Y, _mm256_cvtsi256_si32(i1), i1);
+    // [0-3 8-11 | 4-7 12-15]
+    const __m256i a = _mm256_packs_epi32(low_half(g0), low_half(g1));
+    const __m256i b = _mm256_packs_epi32(_mm256_srai_epi32(g0, 16), _mm256_srai_epi32(g1, 16));
+    const __m256i luma = finish(_mm256_srai_epi16(
+        _mm256_add_epi16(_mm256_add_epi16(a, high(_mm256_sub_epi16(b, a), _mm256_packus_epi32(f0, f1))),
+                         _mm256_set1_epi16(int16_t(1 << (cs - 1)))),
+        cs));
+    const int32_t j0 = _mm256_cvtsi256_si32(j);
+    const __m256i gu = near_pairs(U, j0, j), gv = near_pairs(V, j0, j);
+    // [Cb 0-3 Cr 0-3 | Cb 4-7 Cr 4-7]
+    const __m256i ca = _mm256_packs_epi32(low_half(gu), low_half(gv));
+    const __m256i cd = _mm256_sub_epi16(_mm256_packs_epi32(_mm256_srai_epi32(gu, 16), _mm256_srai_epi32(gv, 16)), ca);
+    const __m256i h = _mm256_packs_epi32(_mm256_sub_epi32(zero, odd), _mm256_sub_epi32(zero, odd));
+    const __m256i sum = _mm256_add_epi16(_mm256_add_epi16(_mm256_add_epi16(ca, ca), _mm256_and_si256(cd, h)),
+                                         _mm256_add_epi16(high(cd, _mm256_packus_epi32(fc, fc)), _mm256_set1_epi16(int16_t(1 << cs))));
+    const __m256i chroma = finish(_mm256_srai_epi16(sum, cs + 1));
+    // Pairs in memory order: luma (Y0, Y1) words and (Cb, Cr) words interleaved.
+    const __m256i lp = _mm256_permutevar8x32_epi32(luma, _mm256_setr_epi32(0, 1, 4, 5, 2, 3, 6, 7));
+    const __m256i cc = _mm256_unpacklo_epi16(chroma, _mm256_srli_si256(chroma, 8));
+    const __m256i x = _mm256_unpacklo_epi16(lp, cc), z = _mm256_unpackhi_epi16(lp, cc);  // [0 1 | 4 5], [2 3 | 6 7]
+    if constexpr (sizeof(S) == 1) {
+        _mm256_storeu_si256(reinterpret_cast<__m256i*>(d), _mm256_packus_epi16(x, z));
+    } else {
+        _mm256_storeu_si256(reinterpret_cast<__m256i*>(d), _mm256_permute2x128_si256(x, z, 0x20));
+        _mm256_storeu_si256(reinterpret_cast<__m256i*>(d + 16), _mm256_permute2x128_si256(x, z, 0x31));
+    }
+}
+
 // The plain whole-pixel rule on two RGBQ pixels in 32-bit lanes: limited
 // when Clamp, mixed with the destination at `d` when not Full, the low
 // bits kept as the scalar rule stores them.
@@ -1408,6 +1462,69 @@ struct AreaSamplerV : AreaSampler<Units> {
     }
 #endif
 
+#if defined(LORVEX_ISA_AVX2)
+    // 4:2:2 at magnification (samples w >= 0x10000 wide) and level 4096: a
+    // luma span meets two samples at most, and so does a chroma span of
+    // 0x20000 over samples 2w wide, so that each output is the interpolation
+    // of pairs8_16 at the width n1 it takes of the second sample. Eight pairs
+    // at a time from split planes, for chunks whose elements stay within
+    // +-16000. Returns the pairs drawn.
+    template <bool clamp>
+    int32_t pair_area_mag16(typename Dst::sample* d, int32_t n)
+    {
+        constexpr int cs = Units::colour_shift;
+        constexpr int32_t kCap = 1024;
+        if constexpr (cs < 1 || cs > 14) {
+            (void)d, (void)n;
+            return 0;
+        } else {
+            const int32_t w = this->w, w2 = 2 * w;
+            if (w < 0x10000 || this->r <= 0 || this->r > w || this->r2 <= 0 || this->r2 > w2 || n < 8) return 0;
+            alignas(32) int16_t planes[2 * kCap + 128];
+            int16_t* const Y = planes;
+            int16_t* const U = planes + kCap + 32;
+            int16_t* const V = planes + kCap + kCap / 2 + 80;
+            constexpr int32_t kPerChunk = ((kCap - 16) / 2) & ~7;  // two luma samples a pair at most
+            const __m256i low = _mm256_set1_epi32(0xFFFF);
+            constexpr int32_t kLanes[8] = {0, 1, 2, 3, 4, 5, 6, 7};
+            int32_t done = 0;
+            while (n - done >= 8) {
+                const int32_t m = std::min((n - done) & ~7, kPerChunk);
+                const int32_t u0 = w - this->r, v0 = w2 - this->r2;
+                const int32_t p = this->p, p2 = this->p2;
+                const int32_t y_last = p + int32_t((int64_t(u0) + int64_t(2 * m) * 0x10000) / w) + 1;
+                const int32_t c_last = p2 + int32_t((int64_t(v0) + int64_t(m) * 0x20000) / w2) + 1;
+                const int32_t b = std::min(p & ~1, 2 * p2);
+                int32_t e = std::max(y_last + 1, 2 * c_last + 2);
+                e += e & 1;
+                if (e - b > kCap || !within(this->line, 2 * b, 2 * e, -16000, 16000)) break;
+                split_422(this->line, b, e - b, Y, U, V);
+                const __m256i ybase = _mm256_set1_epi32(p - b), cbase = _mm256_set1_epi32(p2 - b / 2);
+                Spans luma(u0, 0x10000, w, 0x10000, kLanes), chroma(v0, 0x20000, w2, 0x20000, kLanes);
+                for (int32_t k = 0; k < m; k += 8, d += 32) {
+                    const Widths y0 = luma.widths();
+                    luma.next();
+                    const Widths y1 = luma.widths();
+                    luma.next();
+                    const Widths cw = chroma.widths();
+                    chroma.next();
+                    pairs8_16<Dst, cs, clamp>(d, Y, U, V, _mm256_add_epi32(y0.q, ybase), y0.n1, _mm256_add_epi32(y1.q, ybase),
+                                              y1.n1, _mm256_add_epi32(cw.q, cbase), _mm256_srli_epi32(cw.n1, 16),
+                                              _mm256_and_si256(cw.n1, low));
+                }
+                // Both walks past the chunk.
+                const int32_t u_end = u0 + 2 * m * 0x10000, v_end = v0 + m * 0x20000;
+                this->p += u_end / w;
+                this->r = w - u_end % w;
+                this->p2 += v_end / w2;
+                this->r2 = w2 - v_end % w2;
+                done += m;
+            }
+            return done;
+        }
+    }
+#endif
+
     void generic_run(const MapContext& c, typename Dst::sample* d, int32_t n, bool clamp)
     {
         using T = typename Dst::sample;
@@ -1433,6 +1550,11 @@ struct AreaSamplerV : AreaSampler<Units> {
             // with a longer first sample in step; then the closed form.
             for (int tries = 0; tries < 4 && n >= 4 && w >= 0x8000; ++tries) {
                 if (this->r > 0 && this->r <= w && this->r2 > 0 && this->r2 <= 2 * w) {
+                    if (L == 4096) {
+                        const int32_t fast = clamp ? pair_area_mag16<true>(d, n) : pair_area_mag16<false>(d, n);
+                        d += 4 * fast;
+                        n -= fast;
+                    }
                     const int32_t done = with_run_flags(
                         clamp, L, [&](auto limit, auto full) { return pair_area_run<limit(), full()>(c, d, n); });
                     d += 4 * done;
@@ -1730,20 +1852,15 @@ struct LinearSamplerV : LinearSampler<Units> {
     }
 
 #if defined(LORVEX_ISA_AVX2)
-    // Whole 4:2:2 pairs at magnification and level 4096, eight at a time in
-    // 16-bit lanes, from the line split into planes a chunk at a time, for
-    // chunks whose elements stay within +-16000. Luma as lerp4_16 does.
-    // Chroma lies between pairs j and j + 1 at F = h 0x10000 + f, h the
-    // parity of the pair's first luma sample: a (0x20000 - F) + b F rounds to
-    // (2 a + d h + floor(d f / 2^16) + 2^cs) >> (cs + 1) with d = b - a, the
-    // low half of d f again too small to reach it; the sums stay within 16
-    // bits for elements within +-16000. The neighbouring samples of eight
-    // positions come from two loads (near_pairs), which the step of at most
-    // one sample allows. Returns the pairs drawn.
+    // Whole 4:2:2 pairs at magnification and level 4096, eight at a time
+    // (pairs8_16) from the line split into planes a chunk at a time, for
+    // chunks whose elements stay within +-16000: luma output t at position
+    // p + t step, the chroma of a pair at its first luma position (between
+    // pairs j and j + 1 with h the parity of that luma sample). Returns the
+    // pairs drawn.
     template <bool clamp>
     int32_t pair_run16(typename Dst::sample* d, int32_t n)
     {
-        using S = typename Dst::sample;
         constexpr int cs = Units::colour_shift;
         constexpr int32_t kCap = 1024;  // pixels of a chunk's planes
         if constexpr (cs < 1 || cs > 14) {
@@ -1760,18 +1877,7 @@ struct LinearSamplerV : LinearSampler<Units> {
             int16_t* const V = planes + kCap + kCap / 2 + 80;
             constexpr int32_t kPerChunk = ((kCap - 8) / 2) & ~7;  // two luma samples a pair at most, and the next
             const __m256i t8 = _mm256_mullo_epi32(_mm256_setr_epi32(0, 1, 2, 3, 4, 5, 6, 7), _mm256_set1_epi32(step));
-            const __m256i round_y = _mm256_set1_epi16(int16_t(1 << (cs - 1))), round_c = _mm256_set1_epi16(int16_t(1 << cs));
-            const __m256i pair_order = _mm256_setr_epi32(0, 1, 4, 5, 2, 3, 6, 7);
-            const __m256i zero = _mm256_setzero_si256(), top = _mm256_set1_epi16(int16_t(Dst::max));
-            const auto low_half = [](__m256i g) { return _mm256_srai_epi32(_mm256_slli_epi32(g, 16), 16); };
-            const auto high = [](__m256i dv, __m256i F) {  // floor(dv F / 2^16), F unsigned
-                return _mm256_add_epi16(_mm256_mulhi_epi16(dv, F), _mm256_and_si256(dv, _mm256_srai_epi16(F, 15)));
-            };
-            const auto finish = [&](__m256i v) {
-                if constexpr (clamp) return _mm256_min_epi16(_mm256_max_epi16(v, zero), top);
-                if constexpr (sizeof(S) == 1) return _mm256_and_si256(v, _mm256_set1_epi16(0xFF));
-                return v;  // sixteen bits, as the scalar rule stores them
-            };
+            const __m256i low = _mm256_set1_epi32(0xFFFF), one = _mm256_set1_epi32(1);
             int32_t done = 0;
             while (n - done >= 8) {
                 const int32_t m = std::min((n - done) & ~7, kPerChunk);
@@ -1783,43 +1889,14 @@ struct LinearSamplerV : LinearSampler<Units> {
                 split_422(this->line, b, e - b, Y, U, V);
                 int32_t p = p0 - (b << 16);  // positions within the planes
                 for (int32_t k = 0; k < m; k += 8, d += 32, p += 16 * step) {
-                    // Luma outputs 0 .. 7 and 8 .. 15 (Y0 Y1 of pairs 0 .. 3, 4 .. 7).
                     const __m256i P0 = _mm256_add_epi32(_mm256_set1_epi32(p), t8);
                     const __m256i P1 = _mm256_add_epi32(_mm256_set1_epi32(p + 8 * step), t8);
-                    const __m256i g0 = near_pairs(Y, p >> 16, _mm256_srai_epi32(P0, 16));
-                    const __m256i g1 = near_pairs(Y, (p + 8 * step) >> 16, _mm256_srai_epi32(P1, 16));
-                    const __m256i mask16 = _mm256_set1_epi32(0xFFFF);
-                    // [0-3 8-11 | 4-7 12-15]
-                    const __m256i a = _mm256_packs_epi32(low_half(g0), low_half(g1));
-                    const __m256i bv = _mm256_packs_epi32(_mm256_srai_epi32(g0, 16), _mm256_srai_epi32(g1, 16));
-                    const __m256i F = _mm256_packus_epi32(_mm256_and_si256(P0, mask16), _mm256_and_si256(P1, mask16));
-                    const __m256i luma =
-                        finish(_mm256_srai_epi16(_mm256_add_epi16(_mm256_add_epi16(a, high(_mm256_sub_epi16(bv, a), F)), round_y), cs));
-                    // Chroma of pairs 0 .. 7 at their first luma position.
+                    // Chroma at each pair's first luma position.
                     const __m256i Pe = _mm256_add_epi32(_mm256_set1_epi32(p), _mm256_add_epi32(t8, t8));
                     const __m256i ie = _mm256_srai_epi32(Pe, 16);
-                    const __m256i j = _mm256_srai_epi32(ie, 1);
-                    const __m256i gu = near_pairs(U, (p >> 16) >> 1, j), gv = near_pairs(V, (p >> 16) >> 1, j);
-                    // [Cb 0-3 Cr 0-3 | Cb 4-7 Cr 4-7]
-                    const __m256i ca = _mm256_packs_epi32(low_half(gu), low_half(gv));
-                    const __m256i cd = _mm256_sub_epi16(_mm256_packs_epi32(_mm256_srai_epi32(gu, 16), _mm256_srai_epi32(gv, 16)), ca);
-                    const __m256i fe = _mm256_and_si256(Pe, mask16);
-                    const __m256i cf = _mm256_packus_epi32(fe, fe);
-                    const __m256i odd = _mm256_sub_epi32(zero, _mm256_and_si256(ie, _mm256_set1_epi32(1)));
-                    const __m256i h = _mm256_packs_epi32(odd, odd);
-                    const __m256i sum = _mm256_add_epi16(_mm256_add_epi16(_mm256_add_epi16(ca, ca), _mm256_and_si256(cd, h)),
-                                                         _mm256_add_epi16(high(cd, cf), round_c));
-                    const __m256i chroma = finish(_mm256_srai_epi16(sum, cs + 1));
-                    // Pairs in memory order: luma (Y0, Y1) words and (Cb, Cr) words interleaved.
-                    const __m256i lp = _mm256_permutevar8x32_epi32(luma, pair_order);
-                    const __m256i cc = _mm256_unpacklo_epi16(chroma, _mm256_srli_si256(chroma, 8));
-                    const __m256i x = _mm256_unpacklo_epi16(lp, cc), z = _mm256_unpackhi_epi16(lp, cc);  // [0 1 | 4 5], [2 3 | 6 7]
-                    if constexpr (sizeof(S) == 1) {
-                        _mm256_storeu_si256(reinterpret_cast<__m256i*>(d), _mm256_packus_epi16(x, z));
-                    } else {
-                        _mm256_storeu_si256(reinterpret_cast<__m256i*>(d), _mm256_permute2x128_si256(x, z, 0x20));
-                        _mm256_storeu_si256(reinterpret_cast<__m256i*>(d + 16), _mm256_permute2x128_si256(x, z, 0x31));
-                    }
+                    pairs8_16<Dst, cs, clamp>(d, Y, U, V, _mm256_srai_epi32(P0, 16), _mm256_and_si256(P0, low),
+                                              _mm256_srai_epi32(P1, 16), _mm256_and_si256(P1, low), _mm256_srai_epi32(ie, 1),
+                                              _mm256_and_si256(ie, one), _mm256_and_si256(Pe, low));
                 }
                 this->pos = p0 + 2 * m * step;
                 done += m;
