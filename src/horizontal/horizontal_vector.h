@@ -68,7 +68,7 @@ inline void put_whole(typename Dst::sample* at, int32_t v, bool clamp, int32_t l
 //     clamp((((D - o)(16384 - A) + 8192) >> 14) + S), or for the luma of a
 //     pixel whose A is above 16384 clamp(((S - o) 16384) / A + o).
 template <class Dst, bool Fast>
-inline void pair_over(typename Dst::sample* d, __m128i S, int32_t a0, int32_t a1, bool clamp)
+LORVEX_ALWAYS_INLINE void pair_over(typename Dst::sample* d, __m128i S, int32_t a0, int32_t a1, bool clamp)
 {
     using Sm = typename Dst::sample;
     constexpr int sh = Dst::buffer_shift;
@@ -165,7 +165,7 @@ inline bool within(const int16_t* line, int32_t from, int32_t to, int16_t lo, in
 // d where f's top bit is set. Every term fits 16 bits while the elements
 // stay within +-16383.
 template <int cs>
-inline __m256i lerp4_16(const int16_t* line, const int32_t* at, __m256i F)
+LORVEX_ALWAYS_INLINE __m256i lerp4_16(const int16_t* line, const int32_t* at, __m256i F)
 {
     static_assert(cs >= 1 && cs <= 15);
     const auto two = [&](int x, int y) {
@@ -184,7 +184,7 @@ inline __m256i lerp4_16(const int16_t* line, const int32_t* at, __m256i F)
 // i0 .. i0 + 8, as 32-bit lanes: two loads (pairs from i0 + 2k and from
 // i0 + 2k + 1) and a pick by each index's parity, where a gather would be
 // slower. Reads words i0 .. i0 + 16 (inside the line buffer's storage).
-inline __m256i near_pairs(const int16_t* w, int32_t i0, __m256i i)
+LORVEX_ALWAYS_INLINE __m256i near_pairs(const int16_t* w, int32_t i0, __m256i i)
 {
     const __m256i o = _mm256_sub_epi32(i, _mm256_set1_epi32(i0));
     const __m256i half = _mm256_srli_epi32(o, 1);
@@ -197,14 +197,14 @@ inline __m256i near_pairs(const int16_t* w, int32_t i0, __m256i i)
 // Spreads four of eight 32-bit lanes (the low four, or the high) over pairs
 // of lanes, [j j j+1 j+1 | ...]: with twice16, a pixel's value in its four
 // 16-bit lanes.
-inline __m256i spread4(__m256i v, int high)
+LORVEX_ALWAYS_INLINE __m256i spread4(__m256i v, int high)
 {
     return _mm256_permutevar8x32_epi32(v, high ? _mm256_setr_epi32(4, 4, 5, 5, 6, 6, 7, 7)
                                                : _mm256_setr_epi32(0, 0, 1, 1, 2, 2, 3, 3));
 }
 
 // The low half of each 32-bit lane in both of its 16-bit halves.
-inline __m256i twice16(__m256i v)
+LORVEX_ALWAYS_INLINE __m256i twice16(__m256i v)
 {
     return _mm256_or_si256(_mm256_and_si256(v, _mm256_set1_epi32(0xFFFF)), _mm256_slli_epi32(v, 16));
 }
@@ -220,7 +220,7 @@ inline __m256i twice16(__m256i v)
 // samples of their first (near_pairs). Stored limited to 0 .. max when Clamp,
 // else with their low bits, as the scalar rule stores them.
 template <class Dst, int cs, bool Clamp>
-inline void pairs8_16(typename Dst::sample* d, const int16_t* Y, const int16_t* U, const int16_t* V, __m256i i0,
+LORVEX_ALWAYS_INLINE void pairs8_16(typename Dst::sample* d, const int16_t* Y, const int16_t* U, const int16_t* V, __m256i i0,
                       __m256i f0, __m256i i1, __m256i f1, __m256i j, __m256i odd, __m256i fc)
 {
     using S = typename Dst::sample;
@@ -267,7 +267,7 @@ inline void pairs8_16(typename Dst::sample* d, const int16_t* Y, const int16_t* 
 // when Clamp, mixed with the destination at `d` when not Full, the low
 // bits kept as the scalar rule stores them.
 template <bool Clamp, bool Full>
-inline __m256i whole_rgbq2(__m256i y, const uint8_t* d, int32_t level)
+LORVEX_ALWAYS_INLINE __m256i whole_rgbq2(__m256i y, const uint8_t* d, int32_t level)
 {
     if constexpr (Clamp) y = _mm256_min_epi32(_mm256_max_epi32(y, _mm256_setzero_si256()), _mm256_set1_epi32(255));
     if constexpr (!Full) {
@@ -282,7 +282,7 @@ inline __m256i whole_rgbq2(__m256i y, const uint8_t* d, int32_t level)
 
 // Eight RGBQ pixels from four registers of two, in 32-bit lanes holding
 // bytes: packed (lanes [0 2 | 1 3] and [4 6 | 5 7]) and put back in order.
-inline void store_rgbq8(uint8_t* d, const __m256i v[4])
+LORVEX_ALWAYS_INLINE void store_rgbq8(uint8_t* d, const __m256i v[4])
 {
     const __m256i w = _mm256_packus_epi16(_mm256_packus_epi32(v[0], v[1]), _mm256_packus_epi32(v[2], v[3]));
     _mm256_storeu_si256(reinterpret_cast<__m256i*>(d),
@@ -293,7 +293,7 @@ inline void store_rgbq8(uint8_t* d, const __m256i v[4])
 // and [4 5 | 6 7]: limited to 0 .. 255 when Clamp, else cut to their low
 // byte as the scalar rule stores them.
 template <bool Clamp>
-inline void store_rgbq8_16(uint8_t* d, __m256i g0, __m256i g1)
+LORVEX_ALWAYS_INLINE void store_rgbq8_16(uint8_t* d, __m256i g0, __m256i g1)
 {
     const auto cut = [](__m256i v) {
         if constexpr (Clamp) return _mm256_min_epi16(_mm256_max_epi16(v, _mm256_setzero_si256()), _mm256_set1_epi16(255));
@@ -309,7 +309,7 @@ inline void store_rgbq8_16(uint8_t* d, __m256i g0, __m256i g1)
 // >> 14) + S), or where A is above 16384 clamp((S 16384) / A), the division
 // in double precision (exact for these operands; truncation is the integer
 // division's). A pixel whose A is below 1 keeps D.
-inline __m256i source_over2(__m256i S, __m256i A, __m256i D)
+LORVEX_ALWAYS_INLINE __m256i source_over2(__m256i S, __m256i A, __m256i D)
 {
     const __m256i zero = _mm256_setzero_si256(), top = _mm256_set1_epi32(255), full = _mm256_set1_epi32(16384);
     const __m256i t =

@@ -18,3 +18,12 @@
 #define LORVEX_CAT_(a, b) a##_##b
 #define LORVEX_CAT(a, b) LORVEX_CAT_(a, b)
 #define LORVEX_ISA_NAME(name) LORVEX_CAT(name, LORVEX_ISA_NAMESPACE)
+
+// Small vector helpers that a kernel's inner loop calls: inlined whatever the
+// compiler's count of their callers, since a call would spill the registers
+// the loop keeps.
+#if defined(__GNUC__)
+#define LORVEX_ALWAYS_INLINE inline __attribute__((always_inline))
+#else
+#define LORVEX_ALWAYS_INLINE inline
+#endif
