@@ -137,6 +137,18 @@ inline void split_422(const int16_t* line, int32_t b, int32_t count, int16_t* y,
     }
 }
 
+// The planes of a chunk of a 4:2:2 line as split_422 writes them: up to
+// kCap pixels of luma and kCap / 2 pairs of each chroma, each plane followed
+// by kSlack words for the loads that reach past a window or an index.
+struct Planes422 {
+    static constexpr int32_t kCap = 1024, kSlack = 64;
+    static constexpr int32_t kToV = (kCap / 2 + kSlack) * 2;  // bytes from a Cb sample to its Cr
+    alignas(32) int16_t words[kCap + kSlack + 2 * (kCap / 2 + kSlack)];
+    int16_t* Y() { return words; }
+    int16_t* U() { return words + kCap + kSlack; }
+    int16_t* V() { return U() + kCap / 2 + kSlack; }
+};
+
 // Whether elements [from, to) of a line all lie within [lo, hi].
 inline bool within(const int16_t* line, int32_t from, int32_t to, int16_t lo, int16_t hi)
 {
@@ -527,6 +539,18 @@ struct BankSamplerV {
 
     void fast_alpha_run(typename Dst::sample* d, int32_t n) { pair_alpha_run<true>(d, n, false); }
 
+    // The colour sums of a whole 4:2:2 pair, its even pixel at sample i0 and
+    // phase ph0, its odd one at i1 and ph1, in memory order [Y0 Cb Y1 Cr].
+    __m128i pair_sums(int32_t i0, int32_t ph0, int32_t i1, int32_t ph1) const
+    {
+        const int32_t j = i0 >> 1, cph = (ph0 >> 1) + ((i0 & 1) ? 8 : 0);
+        const __m128i y0 = fold128(dot<kLumaRegs>(line + 2 * (i0 - T), cy[ph0]));
+        const __m128i y1 = fold128(dot<kLumaRegs>(line + 2 * (i1 - T), cy[ph1]));
+        const __m128i ch = fold128(dot<kChromaRegs>(line + 4 * (j - T), cc[cph]));
+        // [Y0 Y1 Cb Cr] to the order in memory, Y0 Cb Y1 Cr.
+        return _mm_shuffle_epi32(reduce_pair(y0, y1, ch), _MM_SHUFFLE(3, 1, 2, 0));
+    }
+
     // 4:2:2 whole pairs of the source-alpha tables (pair_over): colour from
     // the vector dot products, alpha of both pixels from their windows.
     template <bool Fast>
@@ -537,17 +561,12 @@ struct BankSamplerV {
         for (int32_t k = 0; k < n; ++k, d += 4) {
             const int32_t i0 = pos >> 16, ph0 = (pos >> 12) & 15;
             const int32_t p1 = pos + step, i1 = p1 >> 16, ph1 = (p1 >> 12) & 15;
-            const int32_t j = i0 >> 1, cph = (ph0 >> 1) + ((i0 & 1) ? 8 : 0);
             pos = p1 + step;
             const int32_t a0 = mix_bank<0>(hsum(fold128(dot<kAlphaRegs>(line_a + (i0 - T), ca[ph0]))));
             const int32_t a1 = mix_bank<0>(hsum(fold128(dot<kAlphaRegs>(line_a + (i1 - T), ca[ph1]))));
             if (a0 < 1 && a1 < 1) continue;
-            const __m128i y0 = fold128(dot<kLumaRegs>(line + 2 * (i0 - T), cy[ph0]));
-            const __m128i y1 = fold128(dot<kLumaRegs>(line + 2 * (i1 - T), cy[ph1]));
-            const __m128i ch = fold128(dot<kChromaRegs>(line + 4 * (j - T), cc[cph]));
-            // [Y0 Y1 Cb Cr] to the order in memory, Y0 Cb Y1 Cr.
-            const __m128i x = _mm_shuffle_epi32(reduce_pair(y0, y1, ch), _MM_SHUFFLE(3, 1, 2, 0));
-            pair_over<Dst, Fast>(d, _mm_srai_epi32(_mm_add_epi32(x, round), 14 + cs), a0, a1, clamp);
+            pair_over<Dst, Fast>(d, _mm_srai_epi32(_mm_add_epi32(pair_sums(i0, ph0, i1, ph1), round), 14 + cs), a0, a1,
+                                 clamp);
         }
     }
 
@@ -588,11 +607,8 @@ struct BankSamplerV {
                 const __m256i alpha = _mm256_srai_epi32(_mm256_add_epi32(sums, half), 14);
                 __m256i v[4];
                 for (int q = 0; q < 4; ++q) {
-                    const __m256i s0 = quad_sums(8 * at[2 * q], ph[2 * q] * int32_t(sizeof(qc[0])));
-                    const __m256i s1 = quad_sums(8 * at[2 * q + 1], ph[2 * q + 1] * int32_t(sizeof(qc[0])));
-                    // [pixel 2q | pixel 2q + 1]
-                    const __m256i x = _mm256_add_epi32(_mm256_permute2x128_si256(s0, s1, 0x20),
-                                                       _mm256_permute2x128_si256(s0, s1, 0x31));
+                    const int32_t row = int32_t(sizeof(qc[0]));
+                    const __m256i x = quad_pair_sums(8 * at[2 * q], ph[2 * q] * row, 8 * at[2 * q + 1], ph[2 * q + 1] * row);
                     __m256i S = _mm256_srai_epi32(_mm256_add_epi32(x, round), 14 + cs);
                     if (clamp) S = _mm256_min_epi32(_mm256_max_epi32(S, zero), top);
                     const __m256i A = _mm256_permutevar8x32_epi32(
@@ -747,7 +763,7 @@ struct BankSamplerV {
     {
         using S = typename Dst::sample;
         constexpr int cs = Units::colour_shift;
-        constexpr int kCap = 1024;                  // pixels of a chunk's planes
+        constexpr int kCap = Planes422::kCap;
         constexpr int kRowBytes = kChunks * 16;     // bytes of a phase's taps
         constexpr int kRowShift = kChunks == 1 ? 4 : 5;
         static_assert(kChunks <= 2 && kRowBytes == 1 << kRowShift);
@@ -758,11 +774,11 @@ struct BankSamplerV {
             pair_run(c, d, n, clamp);
             return;
         }
-        alignas(32) int16_t planes[2 * kCap + 32];
-        int16_t* const Y = planes;
-        int16_t* const U = planes + kCap;
-        int16_t* const V = planes + kCap + kCap / 2 + 16;
-        constexpr int32_t kToV = int32_t(kCap / 2 + 16) * 2;  // bytes from a Cb window to its Cr window
+        Planes422 planes;
+        int16_t* const Y = planes.Y();
+        int16_t* const U = planes.U();
+        int16_t* const V = planes.V();
+        constexpr int32_t kToV = Planes422::kToV;
 
         const __m256i round = _mm256_set1_epi32(1 << (13 + cs));
         const __m256i top = _mm256_set1_epi32(Dst::max), zero = _mm256_setzero_si256();
@@ -889,6 +905,14 @@ struct BankSamplerV {
         return acc;
     }
 
+    // The sums of two RGBQ pixels (windows and taps at these byte offsets) as
+    // [pixel 0 | pixel 1].
+    __m256i quad_pair_sums(int32_t at0, int32_t row0, int32_t at1, int32_t row1) const
+    {
+        const __m256i s0 = quad_sums(at0, row0), s1 = quad_sums(at1, row1);
+        return _mm256_add_epi32(_mm256_permute2x128_si256(s0, s1, 0x20), _mm256_permute2x128_si256(s0, s1, 0x31));
+    }
+
     void quad_run(const MapContext& c, typename Dst::sample* d, int32_t n, bool clamp)
     {
         with_run_flags(clamp, c.level, [&](auto limit, auto full) { quad_run<limit(), full()>(c, d, n); });
@@ -918,11 +942,7 @@ struct BankSamplerV {
             p += 8 * step;
             __m256i v[4];
             for (int q = 0; q < 4; ++q) {
-                const __m256i s0 = quad_sums(at[2 * q], row[2 * q]);
-                const __m256i s1 = quad_sums(at[2 * q + 1], row[2 * q + 1]);
-                // [pixel 2q | pixel 2q + 1]
-                __m256i x = _mm256_add_epi32(_mm256_permute2x128_si256(s0, s1, 0x20),
-                                             _mm256_permute2x128_si256(s0, s1, 0x31));
+                __m256i x = quad_pair_sums(at[2 * q], row[2 * q], at[2 * q + 1], row[2 * q + 1]);
                 x = _mm256_srai_epi32(_mm256_add_epi32(x, round), 14 + cs);
                 v[q] = whole_rgbq2<clamp, full>(x, d + 8 * q, L);
             }
@@ -966,14 +986,8 @@ struct BankSamplerV {
         for (int32_t k = 0; k < n; ++k) {
             __m128i v;
             if constexpr (Dst::pairs) {
-                const int32_t i0 = pos >> 16, ph0 = (pos >> 12) & 15;
-                const int32_t p1 = pos + step, i1 = p1 >> 16, ph1 = (p1 >> 12) & 15;
-                const int32_t j = i0 >> 1, cph = (ph0 >> 1) + ((i0 & 1) ? 8 : 0);
-                const __m128i y0 = fold128(dot<kLumaRegs>(line + 2 * (i0 - T), cy[ph0]));
-                const __m128i y1 = fold128(dot<kLumaRegs>(line + 2 * (i1 - T), cy[ph1]));
-                const __m128i ch = fold128(dot<kChromaRegs>(line + 4 * (j - T), cc[cph]));
-                // [Y0 Y1 Cb Cr] to the order in memory, Y0 Cb Y1 Cr.
-                v = _mm_shuffle_epi32(reduce_pair(y0, y1, ch), _MM_SHUFFLE(3, 1, 2, 0));
+                const int32_t p1 = pos + step;
+                v = pair_sums(pos >> 16, (pos >> 12) & 15, p1 >> 16, (p1 >> 12) & 15);
                 pos = p1 + step;
             } else if constexpr (kQuad) {
 #if defined(LORVEX_ISA_AVX2)
@@ -1367,13 +1381,13 @@ struct AreaSamplerV : AreaSampler<Units> {
     {
         using S = typename Dst::sample;
         constexpr int cs = Units::colour_shift;
-        constexpr int kCap = 1024;
+        constexpr int kCap = Planes422::kCap;
         const int32_t w = this->w, w2 = 2 * w;
         if (w < 0x8000 || this->r <= 0 || this->r > w || this->r2 <= 0 || this->r2 > w2 || n < 4) return 0;
-        alignas(32) int16_t planes[2 * kCap + 64];
-        int16_t* const Y = planes;
-        int16_t* const U = planes + kCap + 16;
-        int16_t* const V = planes + kCap + kCap / 2 + 32;
+        Planes422 planes;
+        int16_t* const Y = planes.Y();
+        int16_t* const U = planes.U();
+        int16_t* const V = planes.V();
         const __m256i top = _mm256_set1_epi32(Dst::max), zero = _mm256_setzero_si256();
         const __m256i low = _mm256_set1_epi32(sizeof(S) == 1 ? 0xFF : 0xFFFF);
         const int32_t L = c.level;
@@ -1473,17 +1487,17 @@ struct AreaSamplerV : AreaSampler<Units> {
     int32_t pair_area_mag16(typename Dst::sample* d, int32_t n)
     {
         constexpr int cs = Units::colour_shift;
-        constexpr int32_t kCap = 1024;
+        constexpr int32_t kCap = Planes422::kCap;
         if constexpr (cs < 1 || cs > 14) {
             (void)d, (void)n;
             return 0;
         } else {
             const int32_t w = this->w, w2 = 2 * w;
             if (w < 0x10000 || this->r <= 0 || this->r > w || this->r2 <= 0 || this->r2 > w2 || n < 8) return 0;
-            alignas(32) int16_t planes[2 * kCap + 128];
-            int16_t* const Y = planes;
-            int16_t* const U = planes + kCap + 32;
-            int16_t* const V = planes + kCap + kCap / 2 + 80;
+            Planes422 planes;
+            int16_t* const Y = planes.Y();
+            int16_t* const U = planes.U();
+            int16_t* const V = planes.V();
             constexpr int32_t kPerChunk = ((kCap - 16) / 2) & ~7;  // two luma samples a pair at most
             const __m256i low = _mm256_set1_epi32(0xFFFF);
             constexpr int32_t kLanes[8] = {0, 1, 2, 3, 4, 5, 6, 7};
@@ -1796,22 +1810,14 @@ struct LinearSamplerV : LinearSampler<Units> {
     template <bool Fast>
     void pair_alpha_run(typename Dst::sample* d, int32_t n, bool clamp)
     {
-        constexpr int cs = Units::colour_shift;
-        const int16_t* line = this->line;
         for (int32_t k = 0; k < n; ++k, d += 4) {
             const int32_t p0 = this->pos, p1 = p0 + this->step;
             this->pos = p1 + this->step;
             const int32_t a0 = alpha_at(p0), a1 = alpha_at(p1);
             if (a0 < 1 && a1 < 1) continue;
-            const int32_t i = p0 >> 16, f = p0 & 0xFFFF, i1 = p1 >> 16, f1 = p1 & 0xFFFF;
-            const int32_t j = i >> 1;
-            const int32_t w0 = (i & 1) ? 0x10000 - f : 0x20000 - f, w1 = (i & 1) ? 0x10000 + f : f;
-            const __m128i S = _mm_setr_epi32(
-                mix_w16<cs>(int64_t(line[2 * i]) * (0x10000 - f) + int64_t(line[2 * i + 2]) * f),
-                mix_w17<cs>(int64_t(line[4 * j + 1]) * w0 + int64_t(line[4 * j + 5]) * w1),
-                mix_w16<cs>(int64_t(line[2 * i1]) * (0x10000 - f1) + int64_t(line[2 * i1 + 2]) * f1),
-                mix_w17<cs>(int64_t(line[4 * j + 3]) * w0 + int64_t(line[4 * j + 7]) * w1));
-            pair_over<Dst, Fast>(d, S, a0, a1, clamp);
+            alignas(16) int32_t v[4];
+            pair_samples(p0, p1, v);
+            pair_over<Dst, Fast>(d, _mm_load_si128(reinterpret_cast<const __m128i*>(v)), a0, a1, clamp);
         }
     }
 
@@ -1862,19 +1868,17 @@ struct LinearSamplerV : LinearSampler<Units> {
     int32_t pair_run16(typename Dst::sample* d, int32_t n)
     {
         constexpr int cs = Units::colour_shift;
-        constexpr int32_t kCap = 1024;  // pixels of a chunk's planes
+        constexpr int32_t kCap = Planes422::kCap;
         if constexpr (cs < 1 || cs > 14) {
             (void)d, (void)n;
             return 0;
         } else {
             const int32_t step = this->step;
             if (step <= 0 || step > 0x10000 || n < 8) return 0;
-            // The planes, with room for the sixteen words near_pairs reads
-            // past a block's first index.
-            alignas(32) int16_t planes[2 * kCap + 128];
-            int16_t* const Y = planes;
-            int16_t* const U = planes + kCap + 32;
-            int16_t* const V = planes + kCap + kCap / 2 + 80;
+            Planes422 planes;
+            int16_t* const Y = planes.Y();
+            int16_t* const U = planes.U();
+            int16_t* const V = planes.V();
             constexpr int32_t kPerChunk = ((kCap - 8) / 2) & ~7;  // two luma samples a pair at most, and the next
             const __m256i t8 = _mm256_mullo_epi32(_mm256_setr_epi32(0, 1, 2, 3, 4, 5, 6, 7), _mm256_set1_epi32(step));
             const __m256i low = _mm256_set1_epi32(0xFFFF), one = _mm256_set1_epi32(1);
@@ -1911,7 +1915,6 @@ struct LinearSamplerV : LinearSampler<Units> {
     void pair_run(const MapContext& c, typename Dst::sample* d, int32_t n, bool clamp)
     {
         using T = typename Dst::sample;
-        constexpr int cs = Units::colour_shift;
         const int32_t L = c.level;
 #if defined(LORVEX_ISA_AVX2)
         if (L == 4096) {
@@ -1921,18 +1924,29 @@ struct LinearSamplerV : LinearSampler<Units> {
         }
 #endif
         const auto put = [&](T* at, int32_t v) { put_whole<Dst>(at, v, clamp, L); };
-        const int16_t* line = this->line;
         for (int32_t k = 0; k < n; ++k, d += 4) {
-            const int32_t i = this->pos >> 16, f = this->pos & 0xFFFF;
-            const int32_t p1 = this->pos + this->step, i1 = p1 >> 16, f1 = p1 & 0xFFFF;
+            const int32_t p0 = this->pos, p1 = p0 + this->step;
             this->pos = p1 + this->step;
-            const int32_t j = i >> 1;
-            const int32_t w0 = (i & 1) ? 0x10000 - f : 0x20000 - f, w1 = (i & 1) ? 0x10000 + f : f;
-            put(d, mix_w16<cs>(int64_t(line[2 * i]) * (0x10000 - f) + int64_t(line[2 * i + 2]) * f));
-            put(d + 1, mix_w17<cs>(int64_t(line[4 * j + 1]) * w0 + int64_t(line[4 * j + 5]) * w1));
-            put(d + 2, mix_w16<cs>(int64_t(line[2 * i1]) * (0x10000 - f1) + int64_t(line[2 * i1 + 2]) * f1));
-            put(d + 3, mix_w17<cs>(int64_t(line[4 * j + 3]) * w0 + int64_t(line[4 * j + 7]) * w1));
+            int32_t v[4];
+            pair_samples(p0, p1, v);
+            for (int e = 0; e < 4; ++e) put(d + e, v[e]);
         }
+    }
+
+    // The samples of a whole 4:2:2 pair, its even pixel at p0 and its odd one
+    // at p1, in memory order Y0 Cb Y1 Cr: the chroma between pairs j and j + 1
+    // with 17-bit weights from the even pixel's position.
+    void pair_samples(int32_t p0, int32_t p1, int32_t (&v)[4]) const
+    {
+        constexpr int cs = Units::colour_shift;
+        const int16_t* line = this->line;
+        const int32_t i = p0 >> 16, f = p0 & 0xFFFF, i1 = p1 >> 16, f1 = p1 & 0xFFFF;
+        const int32_t j = i >> 1;
+        const int32_t w0 = (i & 1) ? 0x10000 - f : 0x20000 - f, w1 = (i & 1) ? 0x10000 + f : f;
+        v[0] = mix_w16<cs>(int64_t(line[2 * i]) * (0x10000 - f) + int64_t(line[2 * i + 2]) * f);
+        v[1] = mix_w17<cs>(int64_t(line[4 * j + 1]) * w0 + int64_t(line[4 * j + 5]) * w1);
+        v[2] = mix_w16<cs>(int64_t(line[2 * i1]) * (0x10000 - f1) + int64_t(line[2 * i1 + 2]) * f1);
+        v[3] = mix_w17<cs>(int64_t(line[4 * j + 3]) * w0 + int64_t(line[4 * j + 7]) * w1);
     }
 
 #if defined(LORVEX_ISA_AVX2)
