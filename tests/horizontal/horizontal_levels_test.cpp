@@ -171,110 +171,93 @@ int compare_random_strip(const Table& t, std::mt19937& rng, const std::vector<Si
     return compared;
 }
 
-TEST(HorizontalLevels, VectorKernelsMatchScalarOnRandomStrips)
+// `per_table` strips through each table that `keep` accepts, strip i fixed
+// by fix(i), at every vector level; returns the comparisons made, or -1
+// after the first difference (which compare_random_strip reports).
+template <class Fix>
+int compare_strips(uint32_t seed, int per_table, int max_pixels, Fix fix, bool (*keep)(const Table&) = nullptr)
 {
     const auto levels = vector_levels();
-    if (levels.empty()) GTEST_SKIP() << "no vector level on this processor";
-    std::mt19937 rng(11222026);
+    std::mt19937 rng(seed);
     int compared = 0;
-    for (const Table& t : kTables)
-        for (int iter = 0; iter < 100; ++iter) {
-            const int n = compare_random_strip(t, rng, levels, 70, iter);
-            ASSERT_GE(n, 0);
+    for (const Table& t : kTables) {
+        if (keep && !keep(t)) continue;
+        for (int i = 0; i < per_table; ++i) {
+            const int n = compare_random_strip(t, rng, levels, max_pixels, i, fix(i));
+            if (n < 0) return -1;
             compared += n;
         }
-    EXPECT_GT(compared, 1000);
+    }
+    return compared;
+}
+
+#define LORVEX_NEED_VECTOR_LEVEL() \
+    if (vector_levels().empty()) GTEST_SKIP() << "no vector level on this processor"
+
+TEST(HorizontalLevels, VectorKernelsMatchScalarOnRandomStrips)
+{
+    LORVEX_NEED_VECTOR_LEVEL();
+    EXPECT_GT(compare_strips(11222026, 100, 70, [](int) { return Fixed{}; }), 1000);
 }
 
 // The source-alpha tables' whole-pixel runs, in both their forms (clamp on:
 // the general rule; off: the fast one), over alpha with runs of transparent,
-// opaque and overshooting pixels.
+// opaque and overshooting pixels: slots 2 to 6, clamp off and on, three each.
 TEST(HorizontalLevels, SourceAlphaRunsMatchScalar)
 {
-    const auto levels = vector_levels();
-    if (levels.empty()) GTEST_SKIP() << "no vector level on this processor";
-    std::mt19937 rng(5150);
-    int compared = 0;
-    for (const Table& t : kTables) {
-        if (std::string(t.name).find("_SA") == std::string::npos) continue;
-        for (int slot = 2; slot <= 6; ++slot)
-            for (int clamp = 0; clamp <= 1; ++clamp)
-                for (int iter = 0; iter < 3; ++iter) {
-                    Fixed f;
-                    f.slot = slot;
-                    f.clamp = clamp;
-                    f.full = true;
-                    f.alpha_runs = true;
-                    const int n = compare_random_strip(t, rng, levels, 600, iter, f);
-                    ASSERT_GE(n, 0);
-                    compared += n;
-                }
-    }
-    EXPECT_GT(compared, 50);
+    LORVEX_NEED_VECTOR_LEVEL();
+    const auto fix = [](int i) {
+        Fixed f;
+        f.slot = 2 + i / 6;
+        f.clamp = i / 3 % 2;
+        f.full = true;
+        f.alpha_runs = true;
+        return f;
+    };
+    const auto source_alpha = [](const Table& t) { return std::string(t.name).find("_SA") != std::string::npos; };
+    EXPECT_GT(compare_strips(5150, 30, 600, fix, +source_alpha), 50);
 }
 
 // Whole lines: runs long enough to take the vector paths through several of
 // their blocks of work.
 TEST(HorizontalLevels, VectorKernelsMatchScalarOnLongStrips)
 {
-    const auto levels = vector_levels();
-    if (levels.empty()) GTEST_SKIP() << "no vector level on this processor";
-    std::mt19937 rng(20261122);
-    int compared = 0;
-    for (const Table& t : kTables)
-        for (int iter = 0; iter < 12; ++iter) {
-            const int n = compare_random_strip(t, rng, levels, 2500, iter);
-            ASSERT_GE(n, 0);
-            compared += n;
-        }
-    EXPECT_GT(compared, 100);
+    LORVEX_NEED_VECTOR_LEVEL();
+    EXPECT_GT(compare_strips(20261122, 12, 2500, [](int) { return Fixed{}; }), 100);
 }
 
-// Area runs at any ratio, at reductions of 1 to 4 and at the common ratios,
-// whole lines at level 4096: the closed forms of magnification (two samples
-// a pixel) and of reductions up to 2 (three).
+// Area runs at any ratio, at reductions of 1 to 4 and at the common ratios
+// (kinds 1 to 3, eight each), whole lines at level 4096: the closed forms of
+// magnification (two samples a pixel) and of reductions up to 2 (three).
 TEST(HorizontalLevels, AreaRunsMatchScalar)
 {
-    const auto levels = vector_levels();
-    if (levels.empty()) GTEST_SKIP() << "no vector level on this processor";
-    std::mt19937 rng(3202);
-    int compared = 0;
-    for (const Table& t : kTables)
-        for (int kind = 1; kind <= 3; ++kind)
-            for (int iter = 0; iter < 8; ++iter) {
-                Fixed f;
-                f.slot = 2;
-                f.full = true;
-                f.area_kind = kind;
-                const int n = compare_random_strip(t, rng, levels, 1500, iter, f);
-                ASSERT_GE(n, 0);
-                compared += n;
-            }
-    EXPECT_GT(compared, 100);
+    LORVEX_NEED_VECTOR_LEVEL();
+    const auto fix = [](int i) {
+        Fixed f;
+        f.slot = 2;
+        f.full = true;
+        f.area_kind = 1 + i / 8;
+        return f;
+    };
+    EXPECT_GT(compare_strips(3202, 24, 1500, fix), 100);
 }
 
 // Runs that work in narrower lanes while the line's elements allow it check
 // them first: lines with a few elements anywhere in the 16-bit range take
-// their wide forms, and must draw the same bytes.
+// their wide forms, and must draw the same bytes (area and linear slots,
+// eight each, half at level 4096 and half magnifying).
 TEST(HorizontalLevels, LinesWithExtremeElementsMatchScalar)
 {
-    const auto levels = vector_levels();
-    if (levels.empty()) GTEST_SKIP() << "no vector level on this processor";
-    std::mt19937 rng(1601);
-    int compared = 0;
-    for (const Table& t : kTables)
-        for (int slot = 2; slot <= 3; ++slot)
-            for (int iter = 0; iter < 8; ++iter) {
-                Fixed f;
-                f.slot = slot;
-                f.extremes = true;
-                f.full = iter % 2 == 0;
-                f.magnify = iter % 4 < 2;
-                const int n = compare_random_strip(t, rng, levels, 2500, iter, f);
-                ASSERT_GE(n, 0);
-                compared += n;
-            }
-    EXPECT_GT(compared, 100);
+    LORVEX_NEED_VECTOR_LEVEL();
+    const auto fix = [](int i) {
+        Fixed f;
+        f.slot = 2 + i / 8;
+        f.extremes = true;
+        f.full = i % 2 == 0;
+        f.magnify = i % 4 < 2;
+        return f;
+    };
+    EXPECT_GT(compare_strips(1601, 16, 2500, fix), 100);
 }
 
 }  // namespace
